@@ -1,0 +1,285 @@
+#include <map>
+
+#include "tavro_dbmgr_internal.h"
+#include "tavro_log.h"
+
+namespace {
+
+constexpr store_column<svc_voc_data> kReportColumns[] = {
+    {"VOC_ID", nullptr, &svc_voc_data::id},
+    {"VOC_TYPE", &svc_voc_data::type, nullptr},
+    {"VOC_TEXT", &svc_voc_data::description, nullptr},
+    {"VOC_APP_NAME", &svc_voc_data::app_name, nullptr},
+    {"VOC_APP_ICON", &svc_voc_data::app_icon, nullptr},
+    {"VOC_SEVERITY", &svc_voc_data::severity, nullptr},
+    {"VOC_DUMP_PATH", &svc_voc_data::dump_file, nullptr},
+    {"VOC_STATE", &svc_voc_data::submitted, nullptr},
+    {"VOC_PUSH_COMMENTS", &svc_voc_data::push_comments, nullptr},
+    {"VOC_PUSH_READ", nullptr, &svc_voc_data::push_read},
+    {"VOC_FILE_NAME", &svc_voc_data::dump_name, nullptr},
+    {"VOC_USER_NAME", &svc_voc_data::user_name, nullptr},
+    {"VOC_DATE_OF_CREATION", &svc_voc_data::date_of_creation, nullptr},
+    {"VOC_DATE_OF_UPDATION", &svc_voc_data::date_of_updation, nullptr},
+    {"VOC_RETRY_COUNT", nullptr, &svc_voc_data::retry_count},
+    {"VOC_ID_SERVER", nullptr, &svc_voc_data::server_voc_id},
+};
+
+constexpr store_column<svc_voc_data> kExtensionKey[] = {{"VOC_ID", nullptr, &svc_voc_data::id}};
+constexpr store_column<svc_voc_data> kExtensionColumns[] = {
+    {"VOC_TITLE_TEXT", &svc_voc_data::title_description, nullptr},
+    {"REF_2", &svc_voc_data::syslog_file, nullptr},
+};
+
+constexpr store_column<tavro_dbmgr_attachment_info> kAttachmentColumns[] = {
+    {"ATTACHMENT_ID", nullptr, &tavro_dbmgr_attachment_info::id},
+    {"ATTACHMENT_FILE_PATH", &tavro_dbmgr_attachment_info::file_path, nullptr},
+    {"ATTACHMENT_FILE_SIZE", nullptr, nullptr, &tavro_dbmgr_attachment_info::file_size},
+    {"ATTACHMENT_FILE_TYPE", &tavro_dbmgr_attachment_info::file_type, nullptr},
+    {"ATTACHMENT_SUGGESTION_ID", nullptr, &tavro_dbmgr_attachment_info::suggestion_id},
+};
+
+GSList *_read_attachments(sqlite3 *db, const statement_text &sql) {
+  const TavroStmt statement = store_prepare(db, sql.c_str());
+  if (!statement) return nullptr;
+  const store_row_reader<tavro_dbmgr_attachment_info> reader(statement.get(), kAttachmentColumns);
+  GSList *attachments = nullptr;
+  while (store_next_row(statement.get())) {
+    auto *attachment = TAVRO_ZALLOC(tavro_dbmgr_attachment_info);
+    reader.read(attachment);
+    attachments = g_slist_prepend(attachments, attachment);
+  }
+  return g_slist_reverse(attachments);
+}
+
+// Reports by VOC_ID. What belongs to them is read by one statement for all: one for each report would make
+// the history three times as slow.
+using report_index = std::map<int, svc_voc_data *>;
+
+std::string _id_list(const report_index &reports) {
+  std::string ids;
+  for (const auto &[id, voc] : reports) ids += (ids.empty() ? "" : ", ") + std::to_string(id);
+  return ids;
+}
+
+// Null only for a row that a damaged file shows out of place.
+svc_voc_data *_owner(const report_index &reports, int voc_id) {
+  const auto found = reports.find(voc_id);
+  return found == reports.end() ? nullptr : found->second;
+}
+
+void _add_extensions(sqlite3 *db, const report_index &reports) {
+  statement_text sql;
+  sa_strcat(sql, "SELECT * FROM TABLE_VOC_EXTENDED WHERE VOC_ID IN (", _id_list(reports).c_str(),
+            ") ORDER BY ID;");
+  const TavroStmt statement = store_prepare(db, sql.c_str());
+  if (!statement) return;
+  const store_row_reader<svc_voc_data> key(statement.get(), kExtensionKey);
+  const store_row_reader<svc_voc_data> reader(statement.get(), kExtensionColumns);
+  while (store_next_row(statement.get())) {
+    svc_voc_data row = {};
+    key.read(&row);
+    svc_voc_data *voc = _owner(reports, row.id);
+    if (voc && !voc->title_description && !voc->syslog_file) reader.read(voc);
+  }
+}
+
+void _add_attachments(sqlite3 *db, const report_index &reports) {
+  statement_text sql;
+  sa_strcat(sql, "SELECT * FROM ATTACHMENT WHERE ATTACHMENT_SUGGESTION_ID IN (", _id_list(reports).c_str(),
+            ") ORDER BY ATTACHMENT_ID DESC;");
+  GSList *attachments = _read_attachments(db, sql);
+  while (attachments) {
+    auto *attachment = static_cast<tavro_dbmgr_attachment_info *>(attachments->data);
+    attachments = g_slist_delete_link(attachments, attachments);
+    svc_voc_data *voc = _owner(reports, attachment->suggestion_id);
+    if (voc)
+      voc->attachments = g_slist_prepend(voc->attachments, attachment);
+    else
+      tavro_db_free_attachment(attachment);
+  }
+}
+
+// The reports that a statement on TABLE_VOC selects, in its order.
+GSList *_read_reports(const statement_text &sql) {
+  const store_session store;
+  if (!store) return nullptr;
+  const TavroStmt statement = store_prepare(store.db(), sql.c_str());
+  if (!statement) return nullptr;
+  const store_row_reader<svc_voc_data> reader(statement.get(), kReportColumns);
+  GSList *list = nullptr;
+  report_index reports;
+  while (store_next_row(statement.get())) {
+    auto *voc = TAVRO_ZALLOC(svc_voc_data);
+    reader.read(voc);
+    if (voc->dump_file && !*voc->dump_file) TAVRO_FREE(voc->dump_file);
+    list = g_slist_prepend(list, voc);
+    reports[voc->id] = voc;
+  }
+  _add_extensions(store.db(), reports);
+  _add_attachments(store.db(), reports);
+  return g_slist_reverse(list);
+}
+
+// The first report of a list; the others, which a unique key does not have, are freed.
+svc_voc_data *_take_single(GSList *reports) {
+  if (!reports) return nullptr;
+  auto *voc = static_cast<svc_voc_data *>(reports->data);
+  reports = g_slist_delete_link(reports, reports);
+  g_slist_free_full(reports,
+                    [](gpointer other) { tavro_dbmgr_free_voc_data(static_cast<svc_voc_data *>(other)); });
+  return voc;
+}
+
+// First column of the first row, when it is the column that was asked for.
+char *_read_single_text(const statement_text &sql, const char *column) {
+  const store_session store;
+  if (!store) return nullptr;
+  const TavroStmt statement = store_prepare(store.db(), sql.c_str());
+  if (!statement || !store_next_row(statement.get())) return nullptr;
+  if (std::strcmp(sqlite3_column_name(statement.get(), 0), column) != 0) return nullptr;
+  return store_column_text(statement.get(), 0);
+}
+
+char *_read_text_of_report(const char *table, const char *column, int voc_id) {
+  statement_text sql;
+  sa_strcat(sql, "SELECT ", column, " FROM ", table, " WHERE VOC_ID = ", voc_id, ";");
+  return _read_single_text(sql, column);
+}
+
+}  // namespace
+
+GSList *tavro_dbmgr_get_vocs_for_history(const char *user_name) {
+  statement_text sql;
+  return _read_reports(sa_strcat(sql, "SELECT * FROM TABLE_VOC WHERE VOC_USER_NAME = ", quoted(user_name),
+                                 " ORDER BY VOC_DATE_OF_UPDATION DESC LIMIT 100;"));
+}
+
+svc_voc_data *tavro_dbmgr_get_voc_by_id(int voc_id) {
+  statement_text sql;
+  return _take_single(_read_reports(sa_strcat(sql, "SELECT * FROM TABLE_VOC WHERE VOC_ID = ", voc_id, ";")));
+}
+
+svc_voc_data *tavro_dbmgr_get_voc_by_server_id(int server_id) {
+  statement_text sql;
+  return _take_single(
+      _read_reports(sa_strcat(sql, "SELECT * FROM TABLE_VOC WHERE VOC_ID_SERVER = ", server_id, ";")));
+}
+
+GSList *tavro_dbmgr_get_attachments(int voc_id, sqlite3 *db) {
+  statement_text sql;
+  return _read_attachments(
+      db, sa_strcat(sql, "SELECT * FROM ATTACHMENT WHERE ATTACHMENT_SUGGESTION_ID = ", voc_id, ";"));
+}
+
+GSList *tavro_dbmgr_get_vocs_to_send() {
+  const store_session store;
+  if (!store) return nullptr;
+  // The current status is the last of those joined by "#".
+  const TavroStmt statement = store_prepare(
+      store.db(),
+      "SELECT VOC_ID FROM TABLE_VOC WHERE (VOC_STATE IN ('10', '11') OR VOC_STATE LIKE '%#10' OR "
+      "VOC_STATE LIKE '%#11') AND VOC_ID IN (SELECT VOC_ID FROM TABLE_VOC_EXTENDED) ORDER BY VOC_ID;");
+  if (!statement) return nullptr;
+  GSList *ids = nullptr;
+  while (store_next_row(statement.get()))
+    ids = g_slist_prepend(ids, GINT_TO_POINTER(store_column_number(statement.get(), 0)));
+  return g_slist_reverse(ids);
+}
+
+int tavro_dbmgr_get_voc_count(const char *user_name) {
+  if (!user_name) {
+    TAVRO_LOGD("user name NULL");
+    return -1;
+  }
+  const store_session store;
+  if (!store) return -1;
+  statement_text sql;
+  sa_strcat(sql, "SELECT count(*) FROM TABLE_VOC WHERE VOC_USER_NAME = ", quoted(user_name), ";");
+  const int count = store_read_number(store.db(), sql.c_str(), -1);
+  TAVRO_LOGD("count: %d", count);
+  return count;
+}
+
+int tavro_dbmgr_is_voc_present(int server_id) {
+  const store_session store;
+  if (!store) return -1;
+  statement_text sql;
+  sa_strcat(sql, "SELECT * FROM TABLE_VOC WHERE VOC_ID_SERVER = ", server_id, ";");
+  const TavroStmt statement = store_prepare(store.db(), sql.c_str());
+  return statement && store_next_row(statement.get()) ? 1 : 0;
+}
+
+int tavro_dbmgr_check_if_dump_file_is_uploaded(const char *dump_name) {
+  if (!dump_name) return -1;
+  const store_session store;
+  if (!store) return -1;
+  statement_text sql;
+  sa_strcat(sql, "SELECT * FROM TABLE_VOC WHERE VOC_FILE_NAME = ", quoted(dump_name), ";");
+  const TavroStmt statement = store_prepare(store.db(), sql.c_str());
+  if (!statement) return -1;
+  // A match and no match are not told apart here: callers only ask whether the lookup ran.
+  const int ret = sqlite3_step(statement.get());
+  return ret == SQLITE_ROW || ret == SQLITE_DONE ? 1 : -1;
+}
+
+char *tavro_dbmgr_get_voc_title_description_by_id(int voc_id) {
+  return _read_text_of_report("TABLE_VOC_EXTENDED", "VOC_TITLE_TEXT", voc_id);
+}
+
+char *tavro_dbmgr_get_voc_syslog_file_by_id(int voc_id) {
+  return _read_text_of_report("TABLE_VOC_EXTENDED", "REF_2", voc_id);
+}
+
+char *tavro_dbmgr_get_device_data_file_by_id(int voc_id) {
+  return _read_text_of_report("TABLE_VOC_EXTENDED", "REF_3", voc_id);
+}
+
+char *tavro_dbmgr_get_voc_description_by_id(int voc_id) {
+  return _read_text_of_report("TABLE_VOC", "VOC_TEXT", voc_id);
+}
+
+char *tavro_dbmgr_get_voc_comments_by_id(int voc_id) {
+  return _read_text_of_report("TABLE_VOC", "VOC_PUSH_COMMENTS", voc_id);
+}
+
+char *tavro_dbmgr_get_dump_file_by_id(int voc_id) {
+  return _read_text_of_report("TABLE_VOC", "VOC_DUMP_PATH", voc_id);
+}
+
+char *tavro_dbmgr_get_app_crash_time_by_id(const char *app_id) {
+  if (!app_id) return nullptr;
+  statement_text sql;
+  return _read_single_text(
+      sa_strcat(sql, "SELECT APP_CRASH_REPORTED_TIME FROM APP_CRASH WHERE APP_ID = ", quoted(app_id), ";"),
+      "APP_CRASH_REPORTED_TIME");
+}
+
+char *tavro_dbmgr_get_app_id_by_name(const char *app_name) {
+  statement_text sql;
+  return _read_single_text(
+      sa_strcat(sql, "SELECT APP_ID FROM APP_DATA WHERE APP_NAME = ", quoted(app_name), ";"), "APP_ID");
+}
+
+int store_last_voc_id() {
+  const store_session store;
+  if (!store) return -1;
+  return store_read_number(
+      store.db(), "SELECT ifnull((SELECT seq FROM sqlite_sequence WHERE name = 'TABLE_VOC'), 0);", -1);
+}
+
+int store_find_voc_above(int voc_id, const char *type, const char *user_name, const char *description) {
+  const store_session store;
+  if (!store) return -1;
+  statement_text sql;
+  sa_strcat(sql, "SELECT ifnull(min(VOC_ID), 0) FROM TABLE_VOC WHERE VOC_ID > ", voc_id,
+            " AND VOC_TYPE = ", quoted(type), " AND VOC_USER_NAME = ", quoted(user_name), " AND VOC_TEXT = ");
+  return store_read_number(store.db(), sa_strcat(sql, quoted(description), ";").c_str(), -1);
+}
+
+bool store_is_voc_complete(int voc_id) {
+  const store_session store;
+  if (!store || voc_id < 1) return false;
+  statement_text sql;
+  sa_strcat(sql, "SELECT count(*) FROM TABLE_VOC_EXTENDED WHERE VOC_ID = ", voc_id, ";");
+  return store_read_number(store.db(), sql.c_str(), 0) > 0;
+}

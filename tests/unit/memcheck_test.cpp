@@ -1,0 +1,121 @@
+#include "tavro_memcheck.h"
+
+#include <gmock/gmock.h>
+
+#include <fstream>
+#include <sstream>
+#include <string>
+#include <thread>
+#include <vector>
+
+#include "tavro_memory.h"
+
+namespace {
+
+using ::testing::EndsWith;
+using ::testing::HasSubstr;
+
+constexpr char kLog[] = "/opt/usr/share/log/platform.log";
+
+// Every test starts with an empty table and sees only the log lines that it caused.
+class MemoryTracker : public ::testing::Test {
+ protected:
+  void SetUp() override {
+    tavro_mem_check_init();
+    new_lines();
+  }
+
+  std::vector<std::string> new_lines() {
+    std::vector<std::string> lines;
+    std::string line;
+    for (std::ifstream log(kLog); std::getline(log, line);) lines.push_back(line);
+    lines.erase(lines.begin(), lines.begin() + static_cast<long>(seen_));
+    seen_ += lines.size();
+    return lines;
+  }
+
+  std::vector<std::string> report() {
+    new_lines();
+    tavro_mem_report();
+    return new_lines();
+  }
+
+ private:
+  std::size_t seen_ = 0;
+};
+
+TEST_F(MemoryTracker, FullTableDropsTheNextBlockWithOneLine) {
+  std::vector<char> blocks(kMemorySlotCount + 1);
+  for (char &block : blocks) tavro_mem_insert(&block, 7, "file.cpp");
+  const auto lines = new_lines();
+  ASSERT_EQ(lines.size(), 1u);
+  EXPECT_THAT(lines[0], EndsWith("All slot full at insertion"));
+  const auto reported = report();
+  ASSERT_EQ(reported.size(), kMemorySlotCount + 1u);
+  EXPECT_THAT(reported.front(), EndsWith("MemoryLeakReport location = file.cpp line = 7"));
+  EXPECT_THAT(reported.back(), EndsWith("MemoryLeakReport total leak = 5000"));
+}
+
+TEST_F(MemoryTracker, RemovingAnUnknownBlockIsLoggedAndChangesNothing) {
+  char known, unknown;
+  tavro_mem_insert(&known, 1, "a.cpp");
+  tavro_mem_remove(&unknown, 9, "b.cpp");
+  EXPECT_THAT(new_lines().at(0), HasSubstr("No match found in remove for "));
+  EXPECT_THAT(report().back(), EndsWith("total leak = 1"));
+}
+
+TEST_F(MemoryTracker, BlockTakesTheLowestFreeSlot) {
+  char blocks[4];
+  for (int i = 0; i < 3; i++) tavro_mem_insert(&blocks[i], i, "a.cpp");
+  tavro_mem_remove(&blocks[1], 0, "a.cpp");
+  EXPECT_EQ(gMemDb[1].slotfree, 0);
+  EXPECT_EQ(gMemDb[1].ptr, &blocks[1]);
+  tavro_mem_insert(&blocks[3], 40, "b.cpp");
+  EXPECT_EQ(gMemDb[1].slotfree, 1);
+  EXPECT_EQ(gMemDb[1].ptr, &blocks[3]);
+  EXPECT_EQ(gMemDb[1].lineNo, 40);
+}
+
+TEST_F(MemoryTracker, HelpersPairEveryBlockWithItsRelease) {
+  struct record {
+    char *name;
+  };
+  auto *held = TAVRO_ZALLOC(record);
+  held->name = TAVRO_STRDUP("name");
+  {
+    TavroText adopted(TAVRO_ADOPT(g_strdup("from the platform")));
+    EXPECT_THAT(report().back(), EndsWith("total leak = 3"));
+  }
+  TAVRO_FREE(held->name);
+  EXPECT_EQ(held->name, nullptr);
+  TAVRO_FREE(held->name);
+  TAVRO_FREE(held);
+  EXPECT_EQ(TAVRO_STRDUP(nullptr), nullptr);
+  EXPECT_THAT(report().front(), EndsWith("total leak = 0"));
+}
+
+TEST_F(MemoryTracker, ThreadsNeverShareASlot) {
+  constexpr int kThreads = 2, kBlocks = 400, kRounds = 5;
+  std::vector<std::vector<char>> blocks(kThreads, std::vector<char>(kBlocks));
+  const auto on_all_threads = [&](auto work) {
+    std::vector<std::thread> threads;
+    for (auto &own : blocks)
+      threads.emplace_back([&own, work] {
+        for (char &block : own) work(&block);
+      });
+    for (auto &thread : threads) thread.join();
+  };
+  const auto insert = [](char *block) { tavro_mem_insert(block, 1, "a.cpp"); };
+  for (int round = 0; round < kRounds; round++) {
+    on_all_threads(insert);
+    ASSERT_THAT(report().back(), EndsWith("total leak = 800"));
+    on_all_threads([insert](char *block) {
+      tavro_mem_remove(block, 2, "a.cpp");
+      insert(block);
+      tavro_mem_remove(block, 3, "a.cpp");
+    });
+    ASSERT_THAT(report().back(), EndsWith("total leak = 0"));
+  }
+}
+
+}  // namespace
