@@ -1,0 +1,18 @@
+// Automatic save of an open compose screen when the battery runs low or the application is ended from
+// outside. A compose screen starts the watch when it opens and stops it when it ends; the Done and draft
+// actions stop it themselves. Main loop only.
+#pragma once
+
+#include <device/callback.h>
+
+struct appdata;
+
+void tavro_autosave_start(appdata *ad);
+void tavro_autosave_stop();
+
+// The application ends and nobody can be asked: what is on an open compose screen becomes a draft.
+void tavro_autosave_at_end(appdata *ad);
+
+// The platform's report of a new battery capacity; `value` carries the percentage, `user_data` is the
+// appdata.
+void __tavro_app_battery_capacity_changed_cb(device_callback_e type, void *value, void *user_data);

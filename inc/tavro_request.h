@@ -1,0 +1,12 @@
+// Reading what a launch request carries. The sender may be any program of the phone: every value is doubted.
+#pragma once
+
+#include <app_control.h>
+
+#include "tavro_memory.h"
+
+// The value under a key; null when it is missing. `error` (may be null) gets the platform's code.
+TavroText tavro_request_text(app_control_h request, const char *key, int *error = nullptr);
+
+// A record id written as decimal text: 1 or more; 0 for null and for anything else.
+int tavro_record_id_from_text(const char *text);

@@ -1,0 +1,39 @@
+// The one public function of each screen, and what the launch dispatch calls to keep open screens in step with
+// the store. Main loop only. None of them takes ownership of its arguments.
+#pragma once
+
+#include <app_control.h>
+#include <glib.h>
+
+struct appdata;
+struct svc_voc_data;
+
+// Landing page, pushed as the first page of the naviframe.
+void tavro_create_landing_page(appdata *ad);
+// Show push_noti_count at the "My Reports" row; nothing when the landing page is not built.
+void tavro_update_landing_page_history_badge(appdata *ad);
+
+// Welcome and account choice, shown until an account is stored in "tavro_username".
+void tavro_create_account_page(appdata *ad);
+
+// Compose screens. A non-null draft fills the screen and sets id_to_delete.
+void tavro_create_problem_page(appdata *ad, const svc_voc_data *draft);
+void tavro_create_idea_page(appdata *ad, const svc_voc_data *draft);
+
+// Pickers, which report once through their callback and pop themselves.
+// `name` is an application's name or the string id of a fixed category; `icon` a path, may be null.
+using tavro_target_chosen = void (*)(appdata *ad, const char *name, const char *icon);
+void tavro_create_target_picker(appdata *ad, tavro_target_chosen chosen);
+// `paths` is a list of const char *, valid during the call only, in the order of choosing.
+using tavro_pictures_chosen = void (*)(appdata *ad, const GSList *paths);
+void tavro_create_gallery_picker(appdata *ad, tavro_pictures_chosen chosen);
+
+// History list "My Reports", and its refresh after a message of the upload service (does nothing when the page
+// is not open). The request may be null.
+void tavro_create_history_page(appdata *ad);
+void tavro_update_history_page(app_control_h service, appdata *ad);
+
+// Details of one stored report. Opening it marks its replies as read and clears the badge.
+void tavro_create_history_details_page(appdata *ad, int voc_id);
+// Reload an open details page; does nothing when another report, or none, is shown.
+void tavro_update_history_details_page(appdata *ad, int voc_id);

@@ -1,0 +1,26 @@
+# Launch dispatch, start and end, and the services without a screen of their own.
+set(TAVRO_CLIENT_CORE
+  tavro_accounts.cpp
+  tavro_appcontrol_util.cpp
+  tavro_appdata.cpp
+  tavro_autosave.cpp
+  tavro_crash_service.cpp
+  tavro_device_status.cpp
+  tavro_drafts.cpp
+  tavro_drafts_actions.cpp
+  tavro_drafts_records.cpp
+  tavro_history_text.cpp
+  tavro_lifecycle.cpp
+  tavro_not_yet.cpp
+  tavro_notifications.cpp
+  tavro_preferences.cpp
+  tavro_push_handlers.cpp
+  tavro_recovery.cpp
+  tavro_report_files.cpp
+  tavro_request.cpp
+  tavro_resend.cpp
+  tavro_resume.cpp
+  tavro_service_bridge.cpp
+  tavro_service_events.cpp
+  tavro_start.cpp
+  tavro_version_check.cpp)

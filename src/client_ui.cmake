@@ -1,0 +1,19 @@
+# Floor 5, the shell, and floor 3, the screens, with their plain logic.
+set(TAVRO_CLIENT_UI
+  tavro_theme.cpp
+  tavro_locale.cpp
+  tavro_widgets.cpp
+  tavro-common.cpp
+  tavro_popup.cpp
+  tavro_targets.cpp
+  tavro_gallery.cpp
+  tavro_details_text.cpp
+  tavro_compose_state.cpp
+  tavro_compose_strip.cpp
+  tavro_compose.cpp
+  tavro_target_picker.cpp
+  tavro_gallery_picker.cpp
+  tavro_landing.cpp
+  tavro_account_page.cpp
+  tavro_history.cpp
+  tavro_history_details.cpp)

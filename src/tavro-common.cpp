@@ -1,0 +1,95 @@
+#include "tavro-common.h"
+
+#include <app.h>
+#include <efl_extension.h>
+#include <sys/stat.h>
+
+#include <cerrno>
+#include <cstring>
+#include <string>
+
+#include "tavro-main.h"
+#include "tavro_log.h"
+#include "tavro_theme.h"
+#include "tavro_widgets.h"
+
+namespace {
+
+constexpr int kWindowWidthUnits = 360;
+constexpr int kWindowHeightUnits = 640;
+
+bool (*_close_guard)(appdata *) = nullptr;
+
+void _close_requested_cb(void *data, Evas_Object *, void *) {
+  appdata *ad = static_cast<appdata *>(data);
+  if (!_close_guard || _close_guard(ad)) ui_app_exit();
+}
+
+void _win_deleted_cb(void *data, Evas *, Evas_Object *, void *) {
+  appdata *ad = static_cast<appdata *>(data);
+  ad->win = ad->conform = ad->layout = ad->nf = nullptr;
+  ad->landing_nf_it = nullptr;
+}
+
+Evas_Object *_build_window(appdata *ad) {
+  Evas_Object *win = elm_win_add(nullptr, "corvane.tavro-lite", ELM_WIN_BASIC);
+  if (!win) return nullptr;
+  elm_win_title_set(win, "Vantor Community");
+  evas_object_smart_callback_add(win, "delete,request", _close_requested_cb, ad);
+  evas_object_event_callback_add(win, EVAS_CALLBACK_DEL, _win_deleted_cb, ad);
+  const double scale = elm_config_scale_get();
+  evas_object_resize(win, static_cast<int>(kWindowWidthUnits * scale), static_cast<int>(kWindowHeightUnits * scale));
+  return win;
+}
+
+void _back_key_cb(void *data, Evas_Object *, void *) {
+  appdata *ad = static_cast<appdata *>(data);
+  elm_naviframe_item_pop(ad->nf);
+}
+
+}  // namespace
+
+void tavro_set_close_guard(bool (*may_close)(appdata *ad)) { _close_guard = may_close; }
+
+bool tavro_create_base_window(appdata *ad) {
+  if (ad->win) return true;
+  tavro_theme_load();
+  ad->win = _build_window(ad);
+  if (!ad->win) {
+    TAVRO_LOGE("no window can be made: is there a display?");
+    return false;
+  }
+  ad->conform = elm_conformant_add(ad->win);
+  evas_object_size_hint_weight_set(ad->conform, EVAS_HINT_EXPAND, EVAS_HINT_EXPAND);
+  elm_win_resize_object_add(ad->win, ad->conform);
+  evas_object_show(ad->conform);
+  ad->layout = tavro_layout_add(ad->conform, "tavro/base");
+  elm_object_content_set(ad->conform, ad->layout);
+  ad->nf = elm_naviframe_add(ad->layout);
+  elm_naviframe_prev_btn_auto_pushed_set(ad->nf, EINA_FALSE);
+  eext_object_event_callback_add(ad->nf, EEXT_CALLBACK_BACK, _back_key_cb, ad);
+  evas_object_show(ad->nf);
+  elm_object_content_set(ad->layout, ad->nf);
+  evas_object_show(ad->win);
+  return true;
+}
+
+int tavro_create_dir(const char *path) {
+  std::string made;
+  for (const char *part = path; *part;) {
+    const char *slash = std::strchr(part + 1, '/');
+    made.assign(path, slash ? static_cast<size_t>(slash - path) : std::strlen(path));
+    if (mkdir(made.c_str(), 0700) != 0 && errno != EEXIST) {
+      TAVRO_LOGD("cannot make folder %s: %s", made.c_str(), std::strerror(errno));
+      return -1;
+    }
+    if (!slash) break;
+    part = slash;
+  }
+  struct stat info {};
+  return stat(path, &info) == 0 && S_ISDIR(info.st_mode) ? 0 : -1;
+}
+
+void tavro_pop_naviframe_middle_items(appdata *ad) {
+  if (ad->nf && ad->landing_nf_it) elm_naviframe_item_pop_to(ad->landing_nf_it);
+}

@@ -1,0 +1,91 @@
+#include <notification.h>
+#include <sys/stat.h>
+
+#include <cstdio>
+
+#include "tavro-common.h"
+#include "tavro-main.h"
+#include "tavro_autosave.h"
+#include "tavro_dbmgr.h"
+#include "tavro_drafts.h"
+#include "tavro_drafts_save.h"
+#include "tavro_memory.h"
+#include "tavro_preferences.h"
+
+namespace {
+
+constexpr gint64 kBytesPerKilobyte = 1024;
+constexpr gint64 kDefaultSizeLimitBytes = 31457280;
+constexpr int kRefused = -1;
+
+gint64 _file_size(const char *path) {
+  struct stat info = {};
+  return path && stat(path, &info) == 0 ? static_cast<gint64>(info.st_size) : 0;
+}
+
+bool _exceeds_size_limit(problem_view_win *view) {
+  view->server_size_error = view->buffer + _file_size(view->syslog_filepath) > tavro_attachment_size_limit();
+  return view->server_size_error;
+}
+
+void _post_size_message() {
+  char message[128] = {};
+  // Kept: the figure is fixed, whatever the limit is.
+  std::snprintf(message, sizeof message, "Cannot send. Feedback message exceeded max limit of %s MB", "30.0");
+  notification_status_message_post(message);
+}
+
+void _free_image_list(appdata *ad) {
+  for (GSList *node = ad->image_list; node; node = node->next) {
+    char *path = static_cast<char *>(node->data);
+    TAVRO_FREE(path);
+  }
+  g_slist_free(ad->image_list);
+  ad->image_list = nullptr;
+}
+
+int _save_by_kind(appdata *ad, int status) {
+  return ad->type == IDEA ? tavro_drafts_save_idea(ad, status, on_failed_store::keep_screen)
+                          : tavro_drafts_save_problem(ad, status, on_failed_store::keep_screen);
+}
+
+// The draft that the screen came from and its automatic copy go when the new record is stored: a store that
+// refuses the record, or an end of the process in between, then loses neither.
+int _end_compose_screen(appdata *ad, int status) {
+  const int opened_from = ad->id_to_delete;
+  const int auto_saved = ad->auto_saved_id;
+  ad->auto_saved_id = 0;
+  const int id = _save_by_kind(ad, status);
+  if (id < 1) {
+    ad->auto_saved_id = auto_saved;
+    if (ad->problem_view || ad->idea_view)
+      notification_status_message_post(tavro_text("IDS_OB_HEADER_NOT_STORED"));
+    return id;
+  }
+  if (opened_from >= 1) tavro_dbmgr_destroy_vocs_by_id(opened_from);
+  if (auto_saved >= 1 && auto_saved != opened_from) tavro_dbmgr_destroy_vocs_by_id(auto_saved);
+  tavro_pop_naviframe_middle_items(ad);
+  _free_image_list(ad);
+  ad->id_to_delete = 0;
+  tavro_autosave_stop();
+  return id;
+}
+
+}  // namespace
+
+gint64 tavro_attachment_size_limit() {
+  const gint64 kilobytes = tavro_preference_int(TAVRO_PREF_MAX_SIZE_ATTACHMENT, 0);
+  return kilobytes > 0 ? kilobytes * kBytesPerKilobyte : kDefaultSizeLimitBytes;
+}
+
+int tavro_send_compose_data(appdata *ad) {
+  if (ad->type != IDEA && ad->problem_view && _exceeds_size_limit(ad->problem_view)) {
+    _post_size_message();
+    return kRefused;
+  }
+  return _end_compose_screen(ad, TAVRO_STATUS_SENDING);
+}
+
+int tavro_save_compose_draft(appdata *ad) {
+  return _end_compose_screen(ad, TAVRO_STATUS_DRAFT_SAVED);
+}

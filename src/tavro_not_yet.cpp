@@ -1,0 +1,67 @@
+#include "tavro_not_yet.h"
+
+#include "tavro_log.h"
+
+#define TAVRO_NOT_YET(what) TAVRO_LOGD("not there yet: %s", what)
+
+void send_cpmgr_shutdown(appdata *) {
+  TAVRO_NOT_YET("shutting the capture service down");
+}
+
+void record_btn_clicked_cb(void *, Evas_Object *, void *) {
+  TAVRO_NOT_YET("the record button");
+}
+
+void tavro_cpmgr_on_get_error_cb(app_control_h, appdata *) {
+  TAVRO_NOT_YET("errors of the capture service");
+}
+
+void ewk_shutdown() {
+  TAVRO_NOT_YET("the web engine");
+}
+
+void tavro_load_url(appdata *, int) {
+  TAVRO_NOT_YET("community pages");
+}
+
+void tavro_create_account_page_ui(appdata *, GSList *) {
+  TAVRO_NOT_YET("the page of the maker's accounts");
+}
+
+int tavro_add_account_result(appdata *) {
+  TAVRO_NOT_YET("adding the maker's account");
+  return 0;
+}
+
+void tavro_refresh_account_page_items(appdata *) {
+  TAVRO_NOT_YET("refreshing the account choice");
+}
+
+void tavro_show_crash_report(appdata *) {
+  TAVRO_NOT_YET("crash reports");
+}
+
+void tavro_take_dump_log(appdata *) {
+  TAVRO_NOT_YET("collecting a dump log");
+}
+
+void tavro_attach_shared_files(appdata *) {
+  TAVRO_NOT_YET("attaching shared files");
+}
+
+Evas_Object *tavro_beta_details_optin_button(appdata *) {
+  TAVRO_NOT_YET("the beta details page");
+  return nullptr;
+}
+
+void tavro_refresh_beta_pages(appdata *, const char *what) {
+  TAVRO_NOT_YET(what);
+}
+
+void tavro_refresh_banners(appdata *) {
+  TAVRO_NOT_YET("the banner carousel");
+}
+
+void tavro_sign_out(appdata *) {
+  TAVRO_NOT_YET("signing out");
+}

@@ -1,0 +1,46 @@
+#include "tavro_recovery.h"
+
+#include <memory>
+
+#include "tavro-common.h"
+#include "tavro-main.h"
+#include "tavro_dbmgr.h"
+#include "tavro_handles.h"
+#include "tavro_history_text.h"
+#include "tavro_log.h"
+#include "tavro_save_journal.h"
+#include "tavro_service_bridge.h"
+
+namespace {
+
+bool is_prepared = false;
+bool replacement_is_untold = false;
+
+void _finish_interrupted_save() {
+  const int id = tavro_journal_recover();
+  if (id < 1) return;
+  const TavroHandle<svc_voc_data, tavro_dbmgr_free_voc_data> voc(tavro_dbmgr_get_voc_by_id(id));
+  TAVRO_LOGD("completed the interrupted save of report %d", id);
+  if (voc && tavro_current_status(voc->submitted) == TAVRO_STATUS_SENDING) {
+    _tavro_launch_upload_mgr_svc(TAVRO_OPERATION_TYPE_UI, id);
+  }
+}
+
+}  // namespace
+
+void tavro_prepare_store() {
+  if (is_prepared) return;
+  is_prepared = true;
+  const tavro_dbmgr_store_state state = tavro_dbmgr_ensure_schema();
+  if (state == TAVRO_STORE_UNUSABLE) return;
+  replacement_is_untold = state == TAVRO_STORE_REPLACED;
+  _finish_interrupted_save();
+}
+
+void tavro_tell_store_was_replaced(appdata *ad) {
+  if (!replacement_is_untold || !ad->win) return;
+  replacement_is_untold = false;
+  tavro_popup_show(ad, &ad->history_file_popup, tavro_text("IDS_OB_HEADER_REPORTS_NOT_READABLE"),
+                   tavro_text("IDS_OB_POP_REPORTS_NOT_READABLE_SET_ASIDE"),
+                   {{tavro_text("IDS_OB_BUTTON_OK"), nullptr}});
+}

@@ -1,0 +1,190 @@
+// Launch dispatch and the upload service's messages: what each request makes the client do.
+#include <badge.h>
+#include <gmock/gmock.h>
+
+#include <filesystem>
+#include <fstream>
+
+#include "client_support.h"
+#include "tavro_appcontrol_util.h"
+#include "tavro_appdata.h"
+#include "tavro_dbmgr.h"
+#include "tavro_notifications.h"
+#include "tavro_preferences.h"
+#include "tavro_service_events.h"
+
+using ::testing::ElementsAre;
+using ::testing::HasSubstr;
+using ::testing::IsEmpty;
+
+namespace {
+
+class Dispatch : public ClientTest {
+ protected:
+  // A report of the person that the desk knows as 77 and has just answered.
+  int answered_report() {
+    sign_in();
+    const int id = store_report("no sound", 12);
+    tavro_dbmgr_update_server_voc_id(id, 77);
+    _tavro_dbmgr_update_push_status_comments("77", "2", "we look at it");
+    return id;
+  }
+};
+
+TEST_F(Dispatch, EveryRequestAsksTheServiceForNewsFirst) {
+  const auto asked = [](const char *operation) {
+    return HasSubstr(std::string("TAVRO_OPERATION_TYPE=") + operation);
+  };
+  app_control(make_request("NOBODY_KNOWS_THIS", {}).get(), nullptr);
+  EXPECT_THAT(Listener::get().take(), ElementsAre(asked("TAVRO_OPERATION_TYPE_APP_UPDATE"),
+                                                  asked("TAVRO_OPERATION_TYPE_GET_BETA_URLS"),
+                                                  asked("TAVRO_OPERATION_TYPE_GET_MAX_LIMIT")));
+  launch("NOBODY_KNOWS_THIS");
+  EXPECT_THAT(Listener::get().take(), ElementsAre(asked("TAVRO_OPERATION_TYPE_APP_UPDATE"),
+                                                  asked("TAVRO_OPERATION_TYPE_GET_BETA_URLS"),
+                                                  asked("TAVRO_OPERATION_TYPE_GET_MAX_LIMIT"),
+                                                  asked("TAVRO_OPERATION_TYPE_GET_USER_BETA_STATUS"),
+                                                  asked("TAVRO_OPERATION_TYPE_GET_MODEL_ALIAS_STATUS")));
+  EXPECT_THAT(ui_calls, ElementsAre("window", "account"));
+}
+
+TEST_F(Dispatch, EveryKnownOperationBuildsTheWindowOnceOrEndsAClientWithoutOne) {
+  const char *const build[] = {"CPMGR_ERROR",
+                               "TAVRO_GET_BETA_URLS",
+                               "TAVRO_LICENSE_URL",
+                               "TAVRO_BANNER_INFO",
+                               "TAVRO_JOIN_BETA",
+                               "TAVRO_GET_BETA_LIST",
+                               "TAVRO_GET_BETA_DETAILS",
+                               "TAVRO_QUIT_BETA",
+                               "TAVRO_OPT_IN_BETA",
+                               "TAVRO_OPT_OUT_BETA",
+                               "TAVRO_GET_BETA_USER_STATUS",
+                               "TAVRO_NON_VOC_PUSH_NTFCTN",
+                               "TAVRO_BETA_PUSH_NTFCTN",
+                               "TAVRO_USER_LOGOUT",
+                               APP_CONTROL_OPERATION_SHARE,
+                               "TAVRO_UPDATE_HISTORY",
+                               nullptr};
+  sign_in();
+  for (const char *operation : build) {
+    ui_calls.clear();
+    launch(operation);
+    launch(operation);
+    EXPECT_THAT(ui_calls, ElementsAre("window", "landing")) << operation;
+    EXPECT_FALSE(tavro_is_ending());
+    evas_object_del(std::exchange(ad.win, nullptr));
+  }
+  for (const char *operation : {"TAVRO_BOARDS_URLS", "CRASH_PROCESS", "DUMP_LOG_PROCESS"}) {
+    tavro_initialize_application_data(&ad);
+    launch(operation);
+    EXPECT_TRUE(tavro_is_ending()) << operation;
+    EXPECT_EQ(ad.win, nullptr);
+  }
+}
+
+TEST_F(Dispatch, ATouchedNotificationOpensTheReportThatItNames) {
+  const int id = answered_report();
+  const auto touch = [this](const char *type, const std::string &voc_id) {
+    ui_calls.clear();
+    launch(nullptr, {{TAVRO_NOTIFICATION_EVENT, TAVRO_NOTIFICATION_CLICKED},
+                     {TAVRO_NOTIFICATION_TYPE, type},
+                     {TAVRO_NOTIFICATION_VOC_ID, voc_id}});
+    return ui_calls;
+  };
+  EXPECT_THAT(touch(TAVRO_NOTIFICATION_VOC, std::to_string(id)),
+              ElementsAre("window", "landing", "history", "details " + std::to_string(id)));
+  for (const char *bad_id : {"", "0", "-1", "12abc", "99999999999999999999", "424242"}) {
+    EXPECT_THAT(touch(TAVRO_NOTIFICATION_VOC, bad_id), ElementsAre("history")) << bad_id;
+  }
+  EXPECT_THAT(touch(TAVRO_NOTIFICATION_NONVOC, std::to_string(id)), IsEmpty());
+}
+
+TEST_F(Dispatch, AnUploadedReportGivesUpItsLogAndIsAnnounced) {
+  sign_in();
+  const std::string log_path = std::string(getenv("TMPDIR")) + "/system.log";
+  std::ofstream(log_path) << "log";
+  const std::string id = std::to_string(store_report("no sound", 12, log_path.c_str()));
+  launch(nullptr);
+  Listener::get().take();
+  ui_calls.clear();
+  launch("TAVRO_UPDATE_HISTORY",
+         {{TAVRO_SERVER_UPLOAD_STATUS, TAVRO_SERVER_UPLOAD_SUCCESS}, {TAVRO_SERVER_PUSH_NOTI_VOC_ID, id}});
+  EXPECT_FALSE(std::filesystem::exists(log_path));
+  EXPECT_THAT(Listener::get().take_answers(), ElementsAre("Notify IDS_OB_MBODY_FEEDBACK_SENT|no sound"));
+  EXPECT_THAT(ui_calls, ElementsAre("update history", "update details " + id));
+  EXPECT_FALSE(tavro_is_ending());
+}
+
+TEST_F(Dispatch, AnUploadResultIsShownOnlyToSomebodyWhoIsSignedIn) {
+  const std::string id = std::to_string(store_report("no sound", 11));
+  const auto fail = [&] {
+    launch("TAVRO_UPDATE_HISTORY",
+           {{TAVRO_SERVER_UPLOAD_STATUS, TAVRO_SERVER_UPLOAD_FAIL}, {TAVRO_SERVER_PUSH_NOTI_VOC_ID, id}});
+    return Listener::get().take_answers();
+  };
+  EXPECT_THAT(fail(), IsEmpty());
+  EXPECT_EQ(ad.connection_popup, nullptr);
+  sign_in();
+  EXPECT_THAT(fail(), ElementsAre("Notify IDS_OB_TMBODY_SENDING_FAILED|no sound"));
+  EXPECT_NE(ad.connection_popup, nullptr);
+}
+
+TEST_F(Dispatch, AReplyRaisesBadgeAndNotificationAndRefreshesWhatIsOpen) {
+  const int id = answered_report();
+  launch(nullptr);
+  Listener::get().take();
+  ui_calls.clear();
+  launch("TAVRO_UPDATE_HISTORY", {{TAVRO_SERVER_PUSH_NOTI_STATUS, TAVRO_SERVER_PUSH_NOTI_UPDATED},
+                                  {TAVRO_SERVER_PUSH_NOTI_VOC_ID, std::to_string(id)},
+                                  {TAVRO_SERVER_PUSH_NOTI_VOC_COMMENTS, "we look at it"}});
+  unsigned int count = 0;
+  EXPECT_EQ(badge_get_count(TAVRO_APP_ID, &count), BADGE_ERROR_NONE);
+  EXPECT_EQ(count, 1u);
+  EXPECT_THAT(ui_calls, ElementsAre("badge 1", "update history", "update details " + std::to_string(id)));
+  EXPECT_THAT(Listener::get().take_answers(), ElementsAre("Notify IDS_OB_MBODY_NEW_REPLY|we look at it"));
+}
+
+TEST_F(Dispatch, AClientStartedForAMessageEndsAndBuildsNoWindow) {
+  const std::string id = std::to_string(answered_report());
+  for (const auto &[key, value] :
+       {std::pair(TAVRO_SERVER_UPLOAD_STATUS, TAVRO_SERVER_UPLOAD_SUCCESS),
+        std::pair(TAVRO_SERVER_PUSH_NOTI_STATUS, TAVRO_SERVER_PUSH_NOTI_UPDATED)}) {
+    tavro_initialize_application_data(&ad);
+    launch("TAVRO_UPDATE_HISTORY", {{key, value}, {TAVRO_SERVER_PUSH_NOTI_VOC_ID, id}});
+    EXPECT_TRUE(tavro_is_ending());
+    EXPECT_EQ(ad.win, nullptr);
+  }
+}
+
+TEST_F(Dispatch, AMandatoryUpdateStopsTheRestOfTheMessage) {
+  const int id = answered_report();
+  preference_set_string(TAVRO_PREF_APP_RESULT_CODE, "2");
+  preference_set_string(TAVRO_PREF_APP_VERSION_CHANGE, "major");
+  preference_set_string(TAVRO_PREF_APP_VERSION, "9.9");
+  launch("TAVRO_UPDATE_HISTORY", {{TAVRO_APP_UPDATE_STATUS, "any"},
+                                  {TAVRO_SERVER_UPLOAD_STATUS, TAVRO_SERVER_UPLOAD_SUCCESS},
+                                  {TAVRO_SERVER_PUSH_NOTI_STATUS, TAVRO_SERVER_PUSH_NOTI_UPDATED},
+                                  {TAVRO_SERVER_PUSH_NOTI_VOC_ID, std::to_string(id)}});
+  EXPECT_THAT(ui_calls, ElementsAre("window", "landing", "popup IDS_OB_HEADER_UPDATE_AVAILABLE"));
+  EXPECT_THAT(Listener::get().take_answers(), IsEmpty());
+  EXPECT_EQ(ad.push_noti_count, 0);
+}
+
+TEST_F(Dispatch, ValuesThatMakeNoSenseChangeNothingStored) {
+  const int id = answered_report();
+  const std::string before = column(id, "VOC_STATE || VOC_PUSH_COMMENTS || VOC_PUSH_READ");
+  launch(nullptr);
+  Listener::get().take();
+  const std::string huge(1 << 20, 'x');
+  for (const std::string &bad : {huge, std::string("12x"), std::string("-5"), std::string("424242")}) {
+    launch("TAVRO_UPDATE_HISTORY", {{TAVRO_SERVER_UPLOAD_STATUS, bad}, {TAVRO_SERVER_PUSH_NOTI_VOC_ID, bad}});
+    launch("TAVRO_UPDATE_HISTORY",
+           {{TAVRO_SERVER_UPLOAD_STATUS, TAVRO_SERVER_UPLOAD_FAIL}, {TAVRO_SERVER_PUSH_NOTI_VOC_ID, bad}});
+    EXPECT_THAT(Listener::get().take_answers(), ElementsAre("Notify IDS_OB_TMBODY_SENDING_FAILED|"));
+  }
+  launch("TAVRO_UPDATE_HISTORY", {{huge.c_str(), huge}});
+  EXPECT_EQ(column(id, "VOC_STATE || VOC_PUSH_COMMENTS || VOC_PUSH_READ"), before);
+}
+
+}  // namespace
