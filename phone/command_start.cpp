@@ -1,0 +1,104 @@
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <cstdio>
+
+#include "commands.h"
+#include "monitor.h"
+#include "options.h"
+#include "process.h"
+
+namespace phone {
+
+namespace {
+
+bool read_options(int argc, char **argv, StartOptions *options) {
+  std::string dir, size;
+  bool has_no_client = false;
+  CommandLine line("",
+                   "Start the phone, with a feedback desk of its own, and show the client. Prints key=value "
+                   "lines once it is ready; Ctrl-C or \"stop\" ends everything that it started.");
+  line.text("dir", &dir, kDirHelp, "DIR");
+  line.flag("headless", &options->is_headless, "Use a virtual display even where there is a desktop");
+  line.flag("detach", &options->is_detached, "Return once the phone is ready");
+  line.flag("no-client", &has_no_client, "Do not show the client");
+  line.flag("accessible", &options->is_accessible, "Publish windows to screen readers from the start");
+  line.text("desk", &options->desk_url, "Use the desk at this address instead of one of its own", "URL");
+  line.text("size", &size, "Size of the virtual display in pixels, 720x1280 by default", "WIDTHxHEIGHT");
+  if (!line.parse(argc, argv)) return false;
+  options->has_client = !has_no_client;
+  if (!line.arguments.empty()) return misuse("start takes no arguments"), false;
+  if (!size.empty() && !parse_size(size, &options->size)) return misuse("no such size: " + size), false;
+  const std::string &url = options->desk_url;
+  if (!url.empty() && url.compare(0, 7, "http://") != 0 && url.compare(0, 8, "https://") != 0)
+    return misuse("the desk's address must begin with http:// or https://"), false;
+  return find_folder(dir, &options->folder);
+}
+
+// Another process has the phone; it may still be starting.
+int report_running(const Folder &folder) {
+  constexpr int kPatienceMilliseconds = 30000;
+  constexpr int kPollMilliseconds = 50;
+  State state;
+  for (int waited = 0; is_running(folder) && waited < kPatienceMilliseconds; waited += kPollMilliseconds) {
+    state = read_state(folder);
+    if (state.count("ready")) break;
+    g_usleep(kPollMilliseconds * 1000);
+  }
+  if (!state.count("ready")) return fail("the phone in " + folder.dir + " is starting or ending; try again");
+  say("the phone in " + folder.dir + " already runs");
+  std::fputs(public_lines(state).c_str(), stdout);
+  return kDone;
+}
+
+int run_phone(StartOptions options, const TavroFd &lock, int ready_fd) {
+  // What a direct-mode phone left behind when it was killed must not meet the new one.
+  const State last = read_state(options.folder);
+  if (last.count("mode") && last.at("mode") == "direct") kill_remains(options.folder);
+  const auto mode = choose_mode(options.folder);
+  if (!mode) return kFailed;
+  options.mode = *mode;
+  const State state = {{"dir", options.folder.dir},
+                       {"mode", *mode == Mode::kDirect ? "direct" : "sandbox"},
+                       {"pid", std::to_string(getpid())},
+                       {"pid_start", process_start_time(getpid())}};
+  return write_state(options.folder, state) ? run_monitor(options, lock, ready_fd) : kFailed;
+}
+
+// The phone runs on in a process of its own; returns when it is ready or has failed.
+int start_detached(const StartOptions &options, const TavroFd &lock) {
+  int ends[2];
+  if (pipe2(ends, O_CLOEXEC) != 0) return fail(std::string("no pipe: ") + g_strerror(errno));
+  TavroFd ready_read(ends[0]), ready_write(ends[1]);
+  const pid_t pid = fork();
+  if (pid < 0) return fail(std::string("cannot start a process: ") + g_strerror(errno));
+  if (pid == 0) {
+    setsid();
+    ready_read = TavroFd();
+    TavroFd nothing(open("/dev/null", O_RDONLY | O_CLOEXEC));
+    dup2(nothing.get(), STDIN_FILENO);
+    _exit(run_phone(options, lock, ready_write.release()));
+  }
+  ready_write = TavroFd();
+  char mark;
+  if (read(ready_read.get(), &mark, 1) == 1) return kDone;
+  waitpid(pid, nullptr, 0);
+  return fail("the phone did not start; what its programs said is in " + options.folder.run("output.log"));
+}
+
+}  // namespace
+
+int command_start(int argc, char **argv) {
+  StartOptions options;
+  if (!read_options(argc, argv, &options)) return kUsage;
+  umask(077);
+  if (!create_folder(options.folder)) return kFailed;
+  const TavroFd lock = lock_folder(options.folder);
+  if (!lock) return report_running(options.folder);
+  return options.is_detached ? start_detached(options, lock) : run_phone(options, lock, -1);
+}
+
+}  // namespace phone
