@@ -18,7 +18,8 @@
 
 namespace {
 
-// What the screen held when it opened, to tell whether leaving would lose anything. There is one screen at most.
+// What the screen held when it opened, to tell whether leaving would lose anything. There is one screen at
+// most.
 struct opened_content {
   std::string title, description;
   guint attachments;
@@ -45,9 +46,10 @@ void _show_target(compose_view_win *view, bool is_idea) {
   elm_atspi_accessible_name_set(view->target_button,
                                 (std::string(tavro_text("IDS_OB_BODY_ABOUT")) + ": " + name).c_str());
   Evas_Object *icon = view->app_icon ? tavro_picture_add(view->target_button, view->app_icon, 44)
-                                     : tavro_tile_add(view->target_button, is_chosen ? tavro_target_tile(view->app_name, false)
-                                                                          : is_idea ? "bulb"
-                                                                                    : "bug");
+                                     : tavro_tile_add(view->target_button,
+                                                      is_chosen ? tavro_target_tile(view->app_name, false)
+                                                      : is_idea ? "bulb"
+                                                                : "bug");
   elm_object_part_content_set(view->target_button, "elm.swallow.content", icon);
 }
 
@@ -85,7 +87,7 @@ void _leave(appdata *ad) {
 void _finish(appdata *ad, int (*save)(appdata *ad)) {
   if (save(ad) >= 1) return;
   if (ad->problem_view && ad->problem_view->server_size_error) return;
-  tavro_popup_show(ad, &ad->connection_popup, tavro_text("IDS_OB_HEADER_NOT_STORED"),
+  tavro_popup_show(ad, &ad->cancel_popup, tavro_text("IDS_OB_HEADER_NOT_STORED"),
                    tavro_text("IDS_OB_BODY_NOT_STORED"), {{tavro_text("IDS_OB_BUTTON_OK"), nullptr}});
 }
 
@@ -99,7 +101,8 @@ void _discard(appdata *ad) {
 }
 
 void _ask_before_leaving(appdata *ad) {
-  tavro_popup_show(ad, &ad->cancel_popup, tavro_text("IDS_OB_HEADER_KEEP_DRAFT"), tavro_text("IDS_OB_BODY_KEEP_DRAFT"),
+  tavro_popup_show(ad, &ad->cancel_popup, tavro_text("IDS_OB_HEADER_KEEP_DRAFT"),
+                   tavro_text("IDS_OB_BODY_KEEP_DRAFT"),
                    {{tavro_text("IDS_OB_BUTTON_STAY"), nullptr},
                     {tavro_text("IDS_OB_BUTTON_DISCARD"), _discard},
                     {tavro_text("IDS_OB_BUTTON_SAVE_DRAFT"), _save_draft}});
@@ -135,7 +138,7 @@ void _show_gap(appdata *ad, tavro_compose_gap gap) {
   const char *body = gap == TAVRO_COMPOSE_NO_TARGET    ? "IDS_OB_BODY_GAP_TARGET"
                      : gap == TAVRO_COMPOSE_NO_CONTENT ? "IDS_OB_BODY_GAP_CONTENT"
                                                        : "IDS_OB_BODY_GAP_SIZE";
-  tavro_popup_show(ad, &ad->connection_popup, tavro_text("IDS_OB_HEADER_NOT_YET"), tavro_text(body),
+  tavro_popup_show(ad, &ad->cancel_popup, tavro_text("IDS_OB_HEADER_NOT_YET"), tavro_text(body),
                    {{tavro_text("IDS_OB_BUTTON_OK"), nullptr}});
 }
 
@@ -155,7 +158,8 @@ void _menu_clicked_cb(void *data, Evas_Object *, void *) {
   compose_view_win *view = tavro_compose_view(ad);
   if (!view) return;
   tavro_menu_show(ad, &view->menu_popup,
-                  {{tavro_text("IDS_OB_BUTTON_SAVE_DRAFT"), _save_draft}, {tavro_text("IDS_OB_BUTTON_DISCARD"), _discard}});
+                  {{tavro_text("IDS_OB_BUTTON_SAVE_DRAFT"), _save_draft},
+                   {tavro_text("IDS_OB_BUTTON_DISCARD"), _discard}});
 }
 
 void _target_clicked_cb(void *data, Evas_Object *, void *) {
@@ -193,7 +197,8 @@ Evas_Object *_build_field(Evas_Object *box, const char *hint, bool is_single_lin
 }
 
 void _build_target(appdata *ad, compose_view_win *view, Evas_Object *box) {
-  view->target_button = tavro_button_add(box, "tavro_target", nullptr, nullptr, nullptr, _target_clicked_cb, ad);
+  view->target_button =
+      tavro_button_add(box, "tavro_target", nullptr, nullptr, nullptr, _target_clicked_cb, ad);
   tavro_fill_width(view->target_button);
   elm_object_part_content_set(view->target_button, "elm.swallow.end", tavro_icon_add(box, "chevron"));
   elm_box_pack_end(box, view->target_button);
@@ -237,8 +242,8 @@ void _build_page(appdata *ad, compose_view_win *view, const svc_voc_data *draft,
   tavro_page_action_add(view->layout, "more", tavro_text("IDS_OB_BUTTON_MORE"), _menu_clicked_cb, ad);
   elm_object_content_set(view->layout, _build_content(ad, view, hint));
   view->bottom = tavro_layout_add(view->layout, "tavro/compose/bottom");
-  Evas_Object *send =
-      tavro_button_add(view->bottom, "tavro_primary", tavro_text("IDS_OB_BUTTON_SEND"), nullptr, nullptr, _send_clicked_cb, ad);
+  Evas_Object *send = tavro_button_add(view->bottom, "tavro_primary", tavro_text("IDS_OB_BUTTON_SEND"),
+                                       nullptr, nullptr, _send_clicked_cb, ad);
   elm_object_part_content_set(view->bottom, "tavro.swallow.button", send);
   elm_object_part_content_set(view->layout, "tavro.swallow.bottom", view->bottom);
   elm_object_signal_emit(view->layout, "tavro,bottom", "tavro");

@@ -26,7 +26,7 @@ void _pictures_chosen(appdata *ad, const GSList *paths) {
   }
   tavro_compose_strip_refresh(ad);
   if (!refused.empty())
-    tavro_popup_show(ad, &ad->connection_popup, tavro_text("IDS_OB_HEADER_NOT_ATTACHED"), refused.c_str(),
+    tavro_popup_show(ad, &ad->cancel_popup, tavro_text("IDS_OB_HEADER_NOT_ATTACHED"), refused.c_str(),
                      {{tavro_text("IDS_OB_BUTTON_OK"), nullptr}});
 }
 
@@ -52,8 +52,9 @@ std::string _file_name(const char *path) {
 Evas_Object *_build_thumb(appdata *ad, compose_view_win *view, const char *path) {
   Evas_Object *frame = tavro_layout_add(view->strip, "tavro/compose/attachment");
   const std::string name = _file_name(path);
-  Evas_Object *thumb = tavro_button_add(frame, "tavro_thumb", nullptr, tavro_picture_add(frame, path, kThumbUnits),
-                                        name.c_str(), nullptr, nullptr);
+  Evas_Object *thumb =
+      tavro_button_add(frame, "tavro_thumb", nullptr, tavro_picture_add(frame, path, kThumbUnits),
+                       name.c_str(), nullptr, nullptr);
   elm_object_content_set(frame, thumb);
   const std::string remove_name = std::string(tavro_text("IDS_OB_BUTTON_REMOVE")) + " " + name;
   Evas_Object *remove = tavro_button_add(frame, "tavro_remove", nullptr, tavro_icon_add(frame, "close/small"),
@@ -66,11 +67,12 @@ Evas_Object *_build_thumb(appdata *ad, compose_view_win *view, const char *path)
 void _show_size(compose_view_win *view) {
   const gint64 limit = tavro_attachment_size_limit();
   char text[128];
-  std::snprintf(text, sizeof text, tavro_text("IDS_OB_BODY_PS1_OF_PS2_MB"), tavro_megabytes(view->buffer).c_str(),
-                tavro_megabytes(limit).c_str());
+  std::snprintf(text, sizeof text, tavro_text("IDS_OB_BODY_PS1_OF_PS2_MB"),
+                tavro_megabytes(view->buffer).c_str(), tavro_megabytes(limit).c_str());
   tavro_layout_text_set(view->bottom, "elm.text", text);
   const double used = limit > 0 ? static_cast<double>(view->buffer) / static_cast<double>(limit) : 1.0;
-  edje_object_part_drag_value_set(elm_layout_edje_get(view->bottom), "tavro.drag.used", std::min(used, 1.0), 0.0);
+  edje_object_part_drag_value_set(elm_layout_edje_get(view->bottom), "tavro.drag.used", std::min(used, 1.0),
+                                  0.0);
   elm_object_signal_emit(view->bottom, view->buffer > limit ? "tavro,over" : "tavro,within", "tavro");
   if (view->buffer == 0) elm_object_signal_emit(view->bottom, "tavro,none", "tavro");
 }
@@ -104,8 +106,9 @@ void tavro_compose_strip_refresh(appdata *ad) {
   elm_box_clear(view->strip);
   for (const GSList *link = view->attachments; link; link = link->next)
     elm_box_pack_end(view->strip, _build_thumb(ad, view, static_cast<const char *>(link->data)));
-  Evas_Object *attach = tavro_button_add(view->strip, "tavro_attach", nullptr, tavro_icon_add(view->strip, "plus"),
-                                         tavro_text("IDS_OB_BUTTON_ATTACH_PICTURES"), _attach_clicked_cb, ad);
+  Evas_Object *attach =
+      tavro_button_add(view->strip, "tavro_attach", nullptr, tavro_icon_add(view->strip, "plus"),
+                       tavro_text("IDS_OB_BUTTON_ATTACH_PICTURES"), _attach_clicked_cb, ad);
   elm_box_pack_end(view->strip, attach);
   _show_size(view);
 }

@@ -60,6 +60,7 @@ void _refresh_screens(app_control_h service, appdata *ad, int voc_id) {
 
 void _upload_succeeded(appdata *ad, int voc_id, const char *description, const char *user_name) {
   TAVRO_LOGD("successfully uploaded");
+  if (ad->connection_popup) evas_object_del(ad->connection_popup);  // What it says is no longer so.
   if (voc_id > 0) {
     tavro_delete_dump_file(voc_id);
     tavro_delete_syslog_file(voc_id);
