@@ -1,5 +1,5 @@
-// Cold start: from the start of a process to its first painted frame, the client beside an empty window, turn by
-// turn. Runs inside a phone whose client does not run.
+// Cold start: from the start of a process to its first painted frame, the client beside an empty window, turn
+// by turn. Runs inside a phone whose client does not run.
 //
 //   cold_start RUNS CLIENT EMPTY_WINDOW
 #include <fcntl.h>
@@ -69,7 +69,7 @@ int main(int argc, char **argv) {
       return 1;
     }
   }
-  std::printf("cold_start client_ms=%.1f empty_window_ms=%.1f ratio=%.2f runs=%zu\n", _median(client), _median(empty),
-              _median(client) / _median(empty), client.size());
+  std::printf("cold_start client_ms=%.1f empty_window_ms=%.1f ratio=%.2f runs=%zu\n", _median(client),
+              _median(empty), _median(client) / _median(empty), client.size());
   return 0;
 }

@@ -33,7 +33,8 @@ Evas_Object *tavro_popup_show(appdata *ad, Evas_Object **slot, const char *title
                               std::initializer_list<tavro_popup_button> buttons);
 
 // A menu below the end of the title bar; a touch beside it closes it. Otherwise as a popup.
-Evas_Object *tavro_menu_show(appdata *ad, Evas_Object **slot, std::initializer_list<tavro_popup_button> entries);
+Evas_Object *tavro_menu_show(appdata *ad, Evas_Object **slot,
+                             std::initializer_list<tavro_popup_button> entries);
 
 // Close every popup that is shown.
 void tavro_delete_all_popup(appdata *ad);

@@ -139,7 +139,7 @@ struct appdata {
   Ecore_Event_Handler *quickpanel_event_handler;
   Ecore_Event_Handler *orientation_change_handler;
   int device_orientation;
-  int recording_status;  // 0: not recording
+  int recording_status;           // 0: not recording
   int screen_recorder_is_latest;  // 1: the capture service speaks the current protocol
   int is_attachment_open;
   Evas_Object *flash_win_1;
@@ -179,7 +179,7 @@ struct appdata {
   Evas_Object *browser_layout;
   Evas_Object *browser_progressbar;
   int cookie_set;
-  int load_urls_to_webview;  // 1 once the forum's addresses are known and may be loaded
+  int load_urls_to_webview;          // 1 once the forum's addresses are known and may be loaded
   Community_url_type comm_url_type;  // TAVRO_COMMUNITY_MAX when no page is chosen
 
   // Theme.

@@ -2,8 +2,8 @@
 // report that is to be sent to the upload service.
 //
 // The compose screens own their records (problem_view, idea_view of appdata) while they are open; a save ends
-// them, unless an automatic save is under way (auto_saved_id is not 0), which keeps the screen open. All of it
-// runs on the main loop. On disk: rows of the store, the device status file of a sent problem report.
+// them, unless an automatic save is under way (auto_saved_id is not 0), which keeps the screen open. All of
+// it runs on the main loop. On disk: rows of the store, the device status file of a sent problem report.
 #pragma once
 
 #include <Elementary.h>
@@ -20,12 +20,12 @@ struct compose_view_win {
   Evas_Object *title_entry;
   Evas_Object *menu_popup;
   Elm_Object_Item *nf_it;
-  GSList *attachments;      // file paths, each a tracked char *
-  char *description;        // UTF-8 copies of the entries, filled when the report is saved
+  GSList *attachments;  // file paths, each a tracked char *
+  char *description;    // UTF-8 copies of the entries, filled when the report is saved
   char *title_description;
-  char *app_name;           // target: an application's name or the string id of a fixed category
-  char *app_icon;           // path of the target's icon, may be null
-  gint64 buffer;            // total size of the attachments in bytes, kept by the screen
+  char *app_name;  // target: an application's name or the string id of a fixed category
+  char *app_icon;  // path of the target's icon, may be null
+  gint64 buffer;   // total size of the attachments in bytes, kept by the screen
 
   // The screen's other widgets; the saver does not look at them.
   Evas_Object *target_button;
@@ -79,8 +79,8 @@ void tavro_add_extra_data_file(tavro_dbmgr_bug_report_info *report);
 // Whether a problem with this target (application name or string id of a category) must carry the system log.
 bool isLogMandatory(const char *appname);
 
-// Free what a record owns and the record's lists; tolerate absent members. The view functions leave the record
-// itself to the caller, who clears its field of appdata.
+// Free what a record owns and the record's lists; tolerate absent members. The view functions leave the
+// record itself to the caller, who clears its field of appdata.
 void tavro_free_bug_report(tavro_dbmgr_bug_report_info *report);
 void tavro_free_suggestion_info(tavro_dbmgr_suggestion_info *suggestion);
 void tavro_free_problem_view(problem_view_win *view);

@@ -7,8 +7,8 @@
 
 constexpr size_t kGalleryMaxPictures = 2000;
 
-// Paths of JPEG and PNG files in the phone's picture and media folders, three levels deep, changed last first,
-// at most kGalleryMaxPictures. Hidden files and folders and symbolic links to folders are left out.
+// Paths of JPEG and PNG files in the phone's picture and media folders, three levels deep, changed last
+// first, at most kGalleryMaxPictures. Hidden files and folders and symbolic links to folders are left out.
 std::vector<std::string> tavro_gallery_pictures();
 
 // The same for given folders.

@@ -1,5 +1,5 @@
-// State of the history pages, shared by the list and the details page only. The list owns the record; it lives
-// from the first time a history page opens until the list page is gone. Main loop only.
+// State of the history pages, shared by the list and the details page only. The list owns the record; it
+// lives from the first time a history page opens until the list page is gone. Main loop only.
 #pragma once
 
 #include <Elementary.h>

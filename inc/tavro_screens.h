@@ -1,5 +1,5 @@
-// The one public function of each screen, and what the launch dispatch calls to keep open screens in step with
-// the store. Main loop only. None of them takes ownership of its arguments.
+// The one public function of each screen, and what the launch dispatch calls to keep open screens in step
+// with the store. Main loop only. None of them takes ownership of its arguments.
 #pragma once
 
 #include <app_control.h>
@@ -28,8 +28,8 @@ void tavro_create_target_picker(appdata *ad, tavro_target_chosen chosen);
 using tavro_pictures_chosen = void (*)(appdata *ad, const GSList *paths);
 void tavro_create_gallery_picker(appdata *ad, tavro_pictures_chosen chosen);
 
-// History list "My Reports", and its refresh after a message of the upload service (does nothing when the page
-// is not open). The request may be null.
+// History list "My Reports", and its refresh after a message of the upload service (does nothing when the
+// page is not open). The request may be null.
 void tavro_create_history_page(appdata *ad);
 void tavro_update_history_page(app_control_h service, appdata *ad);
 

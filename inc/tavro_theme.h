@@ -1,5 +1,5 @@
-// The client's look: one compiled file of layouts and icons, loaded over the toolkit's theme, and the light or
-// dark palette. Main loop only.
+// The client's look: one compiled file of layouts and icons, loaded over the toolkit's theme, and the light
+// or dark palette. Main loop only.
 #pragma once
 
 // Load the layouts once, before the first window. Where the file is missing or broken the toolkit's default

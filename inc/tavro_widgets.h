@@ -1,6 +1,6 @@
-// Builders of the client's own widgets: layouts, icons, tiles, buttons, rows, pages. Texts are plain UTF-8 and
-// become markup here, never at the caller. Every control gets an accessible name: its text, or the one given.
-// Widgets belong to their parent. Main loop only.
+// Builders of the client's own widgets: layouts, icons, tiles, buttons, rows, pages. Texts are plain UTF-8
+// and become markup here, never at the caller. Every control gets an accessible name: its text, or the one
+// given. Widgets belong to their parent. Main loop only.
 #pragma once
 
 #include <Elementary.h>
@@ -48,8 +48,8 @@ Evas_Object *tavro_scrolled_box_add(Evas_Object *parent, Evas_Object **scroller)
 Evas_Object *tavro_page_add(appdata *ad, const char *title, const char *start_icon);
 
 // Add a button to the end of a page's title bar.
-Evas_Object *tavro_page_action_add(Evas_Object *page, const char *icon, const char *name, Evas_Smart_Cb clicked,
-                                   const void *data);
+Evas_Object *tavro_page_action_add(Evas_Object *page, const char *icon, const char *name,
+                                   Evas_Smart_Cb clicked, const void *data);
 
 // Put the page on the naviframe, under its title.
 Elm_Object_Item *tavro_page_push(appdata *ad, Evas_Object *page, const char *title);

@@ -38,7 +38,8 @@ Evas_Object *_build_window(appdata *ad) {
   evas_object_smart_callback_add(win, "delete,request", _close_requested_cb, ad);
   evas_object_event_callback_add(win, EVAS_CALLBACK_DEL, _win_deleted_cb, ad);
   const double scale = elm_config_scale_get();
-  evas_object_resize(win, static_cast<int>(kWindowWidthUnits * scale), static_cast<int>(kWindowHeightUnits * scale));
+  evas_object_resize(win, static_cast<int>(kWindowWidthUnits * scale),
+                     static_cast<int>(kWindowHeightUnits * scale));
   return win;
 }
 
@@ -49,7 +50,9 @@ void _back_key_cb(void *data, Evas_Object *, void *) {
 
 }  // namespace
 
-void tavro_set_close_guard(bool (*may_close)(appdata *ad)) { _close_guard = may_close; }
+void tavro_set_close_guard(bool (*may_close)(appdata *ad)) {
+  _close_guard = may_close;
+}
 
 bool tavro_create_base_window(appdata *ad) {
   if (ad->win) return true;

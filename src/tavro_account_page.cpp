@@ -45,7 +45,8 @@ void _row_clicked_cb(void *data, Evas_Object *row, void *) {
 void _build_account_row(account_page *view, const tavro_account_info *account) {
   const char *second = account->email && *account->email ? account->email : account->user_name;
   Evas_Object *mark = view->chosen == account ? tavro_icon_add(view->list, "check/accent") : nullptr;
-  Evas_Object *row = tavro_row_add(view->list, "person", _shown_name(account), second, mark, _row_clicked_cb, view);
+  Evas_Object *row =
+      tavro_row_add(view->list, "person", _shown_name(account), second, mark, _row_clicked_cb, view);
   evas_object_data_set(row, "account", account);
   elm_box_pack_end(view->list, row);
 }
@@ -73,8 +74,8 @@ void _show_rows(account_page *view) {
   for (const GSList *link = view->accounts; link; link = link->next)
     _build_account_row(view, static_cast<const tavro_account_info *>(link->data));
   Evas_Object *other_mark = view->chosen ? nullptr : tavro_icon_add(view->list, "check/accent");
-  elm_box_pack_end(view->list, tavro_row_add(view->list, "plus", tavro_text("IDS_OB_BODY_ANOTHER_ACCOUNT"), nullptr,
-                                             other_mark, _row_clicked_cb, view));
+  elm_box_pack_end(view->list, tavro_row_add(view->list, "plus", tavro_text("IDS_OB_BODY_ANOTHER_ACCOUNT"),
+                                             nullptr, other_mark, _row_clicked_cb, view));
   if (!view->chosen) _build_name_field(view);
 }
 
@@ -104,16 +105,16 @@ void _continue_clicked_cb(void *data, Evas_Object *, void *) {
   appdata *ad = view->ad;
   TavroText user_name(view->chosen ? TAVRO_STRDUP(view->chosen->user_name) : _typed_name(view).release());
   if (!user_name || !*user_name.get() || g_utf8_strlen(user_name.get(), -1) > kMaxNameLength) {
-    tavro_popup_show(ad, &ad->signout_popup, tavro_text("IDS_OB_HEADER_NOT_YET"), tavro_text("IDS_OB_BODY_GAP_NAME"),
-                     {{tavro_text("IDS_OB_BUTTON_OK"), nullptr}});
+    tavro_popup_show(ad, &ad->signout_popup, tavro_text("IDS_OB_HEADER_NOT_YET"),
+                     tavro_text("IDS_OB_BODY_GAP_NAME"), {{tavro_text("IDS_OB_BUTTON_OK"), nullptr}});
     return;
   }
   if (!view->chosen) _remember_account(user_name.get());
   const int error = preference_set_string(TAVRO_PREF_USERNAME, user_name.get());
   if (error != PREFERENCE_ERROR_NONE) {
     TAVRO_LOGE("the account cannot be stored: %d", error);
-    tavro_popup_show(ad, &ad->signout_popup, tavro_text("IDS_OB_HEADER_NOT_STORED"), tavro_text("IDS_OB_BODY_NAME_NOT_STORED"),
-                     {{tavro_text("IDS_OB_BUTTON_OK"), nullptr}});
+    tavro_popup_show(ad, &ad->signout_popup, tavro_text("IDS_OB_HEADER_NOT_STORED"),
+                     tavro_text("IDS_OB_BODY_NAME_NOT_STORED"), {{tavro_text("IDS_OB_BUTTON_OK"), nullptr}});
     return;
   }
   preference_remove(TAVRO_PREF_PREFERENCE);
@@ -165,8 +166,8 @@ void tavro_create_account_page(appdata *ad) {
   _build_texts(view->page);
   _build_list(view);
   _show_rows(view);
-  Evas_Object *button = tavro_button_add(view->page, "tavro_primary", tavro_text("IDS_OB_BUTTON_CONTINUE"), nullptr, nullptr,
-                                         _continue_clicked_cb, view);
+  Evas_Object *button = tavro_button_add(view->page, "tavro_primary", tavro_text("IDS_OB_BUTTON_CONTINUE"),
+                                         nullptr, nullptr, _continue_clicked_cb, view);
   elm_object_part_content_set(view->page, "tavro.swallow.button", button);
   Elm_Object_Item *item = tavro_page_push(ad, view->page, tavro_text("IDS_OB_HEADER_REPORT_AS"));
   elm_naviframe_item_pop_cb_set(

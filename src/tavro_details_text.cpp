@@ -75,7 +75,8 @@ std::vector<tavro_reply> tavro_details_replies(const svc_voc_data *voc) {
   for (size_t i = 1; i < texts.size(); ++i) {
     if (texts[i] == kNoReply || texts[i].empty()) continue;
     const size_t answers_after = texts.size() - 1 - i;
-    replies.push_back({texts[i], answers_after < times.size() ? _shown_time(times[answers_after].c_str()) : ""});
+    replies.push_back(
+        {texts[i], answers_after < times.size() ? _shown_time(times[answers_after].c_str()) : ""});
   }
   return replies;
 }

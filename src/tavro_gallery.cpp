@@ -53,7 +53,8 @@ std::vector<std::string> tavro_gallery_pictures_in(const std::vector<std::string
   std::vector<std::string> paths;
   for (found_picture &picture : found) {
     if (paths.size() == kGalleryMaxPictures) break;
-    if (std::find(paths.begin(), paths.end(), picture.path) == paths.end()) paths.push_back(std::move(picture.path));
+    if (std::find(paths.begin(), paths.end(), picture.path) == paths.end())
+      paths.push_back(std::move(picture.path));
   }
   return paths;
 }

@@ -107,8 +107,8 @@ Evas_Object *_build_empty(Evas_Object *page) {
 
 void _build_bottom(gallery_picker *picker) {
   Evas_Object *bottom = tavro_layout_add(picker->page, "tavro/bottom");
-  picker->add_button =
-      tavro_button_add(bottom, "tavro_primary", "", nullptr, tavro_text("IDS_OB_BUTTON_ATTACH"), _add_clicked_cb, picker);
+  picker->add_button = tavro_button_add(bottom, "tavro_primary", "", nullptr,
+                                        tavro_text("IDS_OB_BUTTON_ATTACH"), _add_clicked_cb, picker);
   elm_object_content_set(bottom, picker->add_button);
   elm_object_part_content_set(picker->page, "tavro.swallow.bottom", bottom);
   elm_object_signal_emit(picker->page, "tavro,bottom", "tavro");

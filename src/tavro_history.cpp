@@ -24,9 +24,13 @@ namespace {
 // The page's title is also what resuming looks at.
 constexpr char kTitle[] = "IDS_OB_HEADER_MY_REPORTS";
 
-bool _is_idea(const svc_voc_data *voc) { return voc->type && std::strcmp(voc->type, TAVRO_DBMGR_SUGGESTION) == 0; }
+bool _is_idea(const svc_voc_data *voc) {
+  return voc->type && std::strcmp(voc->type, TAVRO_DBMGR_SUGGESTION) == 0;
+}
 
-bool _has_unread_reply(const svc_voc_data *voc) { return voc->push_comments && voc->push_read == 0; }
+bool _has_unread_reply(const svc_voc_data *voc) {
+  return voc->push_comments && voc->push_read == 0;
+}
 
 char *genlist_get_text_part(void *data, Evas_Object *, const char *part) {
   const genlist_item *row = static_cast<genlist_item *>(data);
@@ -118,8 +122,9 @@ void _append_rows(history_app_data_s *history) {
     genlist_item *row = TAVRO_ZALLOC(genlist_item);
     row->index = index;
     row->voc = static_cast<svc_voc_data *>(link->data);
-    row->item = elm_genlist_item_append(history->history_genlist, history->_itc, row, nullptr, ELM_GENLIST_ITEM_NONE,
-                                        _tavro_history_select_cb, GINT_TO_POINTER(index));
+    row->item =
+        elm_genlist_item_append(history->history_genlist, history->_itc, row, nullptr, ELM_GENLIST_ITEM_NONE,
+                                _tavro_history_select_cb, GINT_TO_POINTER(index));
   }
 }
 
@@ -186,7 +191,8 @@ void get_voc_list_from_db(int *count, GSList **vocs, const char *user_name) {
 }
 
 void tavro_free_voc_list(GSList **vocs) {
-  for (GSList *link = *vocs; link; link = link->next) tavro_dbmgr_free_voc_data(static_cast<svc_voc_data *>(link->data));
+  for (GSList *link = *vocs; link; link = link->next)
+    tavro_dbmgr_free_voc_data(static_cast<svc_voc_data *>(link->data));
   g_slist_free(*vocs);
   *vocs = nullptr;
 }

@@ -42,8 +42,8 @@ void _close(appdata *) {
 }
 
 void _show_no_file_accessible(appdata *ad) {
-  tavro_popup_show(ad, &ad->history_file_popup, tavro_text("IDS_OB_HEADER_NOT_YET"), tavro_text("IDS_OB_BODY_FILES_GONE"),
-                   {{tavro_text("IDS_OB_BUTTON_OK"), nullptr}});
+  tavro_popup_show(ad, &ad->history_file_popup, tavro_text("IDS_OB_HEADER_NOT_YET"),
+                   tavro_text("IDS_OB_BODY_FILES_GONE"), {{tavro_text("IDS_OB_BUTTON_OK"), nullptr}});
 }
 
 void _resend_clicked_cb(void *data, Evas_Object *button, void *event_info) {
@@ -52,7 +52,8 @@ void _resend_clicked_cb(void *data, Evas_Object *button, void *event_info) {
   tavro_resend_register_screen({_show_no_file_accessible, _close});
   tavro_send_cb(_details.voc, button, event_info);
   // The page and its button go with the sending; the list behind it shows the report as being sent.
-  ecore_job_add([](void *job_data) { tavro_update_history_page(nullptr, static_cast<appdata *>(job_data)); }, ad);
+  ecore_job_add([](void *job_data) { tavro_update_history_page(nullptr, static_cast<appdata *>(job_data)); },
+                ad);
 }
 
 // ---- Building ----
@@ -70,7 +71,8 @@ void _resized_cb(void *, Evas *, Evas_Object *scroller, void *) {
   Eina_List *children = elm_box_children_get(_details.box);
   void *child = nullptr;
   EINA_LIST_FREE(children, child) {
-    Evas_Object *strut = elm_object_part_content_get(static_cast<Evas_Object *>(child), "tavro.swallow.strut");
+    Evas_Object *strut =
+        elm_object_part_content_get(static_cast<Evas_Object *>(child), "tavro.swallow.strut");
     if (strut) evas_object_size_hint_min_set(strut, _text_width(scroller), 0);
   }
 }
@@ -92,17 +94,20 @@ void _build_status(Evas_Object *box, const svc_voc_data *voc) {
   Evas_Object *card = _add_flowing(box, "tavro/details/status");
   const bool has_title = voc->title_description && *voc->title_description;
   tavro_layout_text_set(card, "elm.text", has_title ? voc->title_description : voc->description);
-  tavro_layout_text_set(card, "elm.text.sub",
-                        (std::string(tavro_text("IDS_OB_BODY_MADE")) + " " + tavro_details_created(voc)).c_str());
+  tavro_layout_text_set(
+      card, "elm.text.sub",
+      (std::string(tavro_text("IDS_OB_BODY_MADE")) + " " + tavro_details_created(voc)).c_str());
   const tavro_status_line line = tavro_details_status_line(voc->submitted);
   std::string now;
   for (int i = 0; i < 4; ++i) {
     const std::string number = std::to_string(i + 1);
     tavro_layout_text_set(card, ("tavro.text." + number).c_str(), tavro_text(line.labels[i]));
-    elm_object_signal_emit(card, ("tavro," + std::string(kSignals[line.steps[i]]) + "," + number).c_str(), "tavro");
+    elm_object_signal_emit(card, ("tavro," + std::string(kSignals[line.steps[i]]) + "," + number).c_str(),
+                           "tavro");
     if (i > 0 && line.steps[i] != TAVRO_STEP_OPEN)
       elm_object_signal_emit(card, ("tavro,leg," + std::to_string(i)).c_str(), "tavro");
-    if (line.steps[i] == TAVRO_STEP_NOW || line.steps[i] == TAVRO_STEP_STOPPED) now = tavro_text(line.labels[i]);
+    if (line.steps[i] == TAVRO_STEP_NOW || line.steps[i] == TAVRO_STEP_STOPPED)
+      now = tavro_text(line.labels[i]);
   }
   elm_object_focus_allow_set(card, EINA_FALSE);
   elm_atspi_accessible_name_set(card, (std::string(tavro_text("IDS_OB_BODY_STATUS")) + ": " + now).c_str());
@@ -116,7 +121,8 @@ Evas_Object *_build_pictures(Evas_Object *parent, const svc_voc_data *voc) {
   for (const GSList *link = voc->attachments; link; link = link->next) {
     const char *path = static_cast<const tavro_dbmgr_attachment_info *>(link->data)->file_path;
     const char *slash = std::strrchr(path, '/');
-    elm_box_pack_end(pictures, tavro_button_add(pictures, "tavro_thumb_bubble", nullptr, tavro_picture_add(pictures, path, 72),
+    elm_box_pack_end(pictures, tavro_button_add(pictures, "tavro_thumb_bubble", nullptr,
+                                                tavro_picture_add(pictures, path, 72),
                                                 slash ? slash + 1 : path, nullptr, nullptr));
   }
   evas_object_show(pictures);
@@ -146,8 +152,9 @@ void _build_reply(Evas_Object *box, const tavro_reply &reply) {
 
 void _build_resend(appdata *ad) {
   Evas_Object *bottom = tavro_layout_add(_details.page, "tavro/bottom");
-  elm_object_content_set(bottom, tavro_button_add(bottom, "tavro_primary", tavro_text("IDS_OB_BUTTON_SEND_AGAIN"), nullptr,
-                                                  nullptr, _resend_clicked_cb, ad));
+  elm_object_content_set(
+      bottom, tavro_button_add(bottom, "tavro_primary", tavro_text("IDS_OB_BUTTON_SEND_AGAIN"), nullptr,
+                               nullptr, _resend_clicked_cb, ad));
   elm_object_part_content_set(_details.page, "tavro.swallow.bottom", bottom);
   elm_object_signal_emit(_details.page, "tavro,bottom", "tavro");
 }

@@ -69,8 +69,10 @@ Evas_Object *_build_hero(Evas_Object *box) {
   return hero;
 }
 
-Evas_Object *_build_card(Evas_Object *box, const char *tile, const char *text, Evas_Smart_Cb clicked, appdata *ad) {
-  Evas_Object *card = tavro_button_add(box, "tavro_card", text, tavro_tile_add(box, tile), nullptr, clicked, ad);
+Evas_Object *_build_card(Evas_Object *box, const char *tile, const char *text, Evas_Smart_Cb clicked,
+                         appdata *ad) {
+  Evas_Object *card =
+      tavro_button_add(box, "tavro_card", text, tavro_tile_add(box, tile), nullptr, clicked, ad);
   evas_object_size_hint_weight_set(card, EVAS_HINT_EXPAND, 0.0);
   evas_object_size_hint_align_set(card, EVAS_HINT_FILL, EVAS_HINT_FILL);
   return card;
@@ -82,16 +84,20 @@ Evas_Object *_build_cards(appdata *ad, Evas_Object *box) {
   elm_box_homogeneous_set(cards, EINA_TRUE);
   elm_box_padding_set(cards, static_cast<int>(12 * elm_config_scale_get()), 0);
   tavro_fill_width(cards);
-  elm_box_pack_end(cards, _build_card(cards, "bug", tavro_text("IDS_OB_HEADER_REPORT_A_PROBLEM"), _problem_clicked_cb, ad));
-  elm_box_pack_end(cards, _build_card(cards, "bulb", tavro_text("IDS_OB_HEADER_SHARE_AN_IDEA"), _idea_clicked_cb, ad));
+  elm_box_pack_end(cards, _build_card(cards, "bug", tavro_text("IDS_OB_HEADER_REPORT_A_PROBLEM"),
+                                      _problem_clicked_cb, ad));
+  elm_box_pack_end(
+      cards, _build_card(cards, "bulb", tavro_text("IDS_OB_HEADER_SHARE_AN_IDEA"), _idea_clicked_cb, ad));
   evas_object_show(cards);
   return cards;
 }
 
 void _build_history_row(appdata *ad, Evas_Object *box) {
-  _history_row = tavro_row_add(box, "list", tavro_text("IDS_OB_HEADER_MY_REPORTS"), "", nullptr, _history_clicked_cb, ad);
+  _history_row = tavro_row_add(box, "list", tavro_text("IDS_OB_HEADER_MY_REPORTS"), "", nullptr,
+                               _history_clicked_cb, ad);
   evas_object_event_callback_add(
-      _history_row, EVAS_CALLBACK_DEL, [](void *, Evas *, Evas_Object *, void *) { _history_row = nullptr; }, nullptr);
+      _history_row, EVAS_CALLBACK_DEL, [](void *, Evas *, Evas_Object *, void *) { _history_row = nullptr; },
+      nullptr);
   elm_box_pack_end(box, _history_row);
   tavro_update_landing_page_history_badge(ad);
 }

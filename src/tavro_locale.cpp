@@ -42,4 +42,6 @@ int tavro_bind_locale() {
   return bind_textdomain_codeset(kTextDomain, "UTF-8") ? 0 : -1;
 }
 
-const char *tavro_text(const char *id) { return id && *id ? dgettext(kTextDomain, id) : id; }
+const char *tavro_text(const char *id) {
+  return id && *id ? dgettext(kTextDomain, id) : id;
+}

@@ -40,7 +40,9 @@ void _button_clicked_cb(void *data, Evas_Object *, void *) {
   if (chosen.clicked) chosen.clicked(chosen.ad);
 }
 
-void _outside_clicked_cb(void *, Evas_Object *popup, const char *, const char *) { evas_object_del(popup); }
+void _outside_clicked_cb(void *, Evas_Object *popup, const char *, const char *) {
+  evas_object_del(popup);
+}
 
 Evas_Object *_overlay_add(appdata *ad, Evas_Object **slot, const char *group) {
   if (!tavro_create_base_window(ad)) return nullptr;
@@ -94,14 +96,16 @@ Evas_Object *tavro_popup_show(appdata *ad, Evas_Object **slot, const char *title
   return popup;
 }
 
-Evas_Object *tavro_menu_show(appdata *ad, Evas_Object **slot, std::initializer_list<tavro_popup_button> entries) {
+Evas_Object *tavro_menu_show(appdata *ad, Evas_Object **slot,
+                             std::initializer_list<tavro_popup_button> entries) {
   Evas_Object *menu = _overlay_add(ad, slot, "tavro/menu");
   if (!menu) return nullptr;
-  elm_layout_signal_callback_add(menu, "tavro,outside", "tavro",
-                                 [](void *, Evas_Object *popup, const char *emission, const char *source) {
-                                   _outside_clicked_cb(nullptr, popup, emission, source);
-                                 },
-                                 nullptr);
+  elm_layout_signal_callback_add(
+      menu, "tavro,outside", "tavro",
+      [](void *, Evas_Object *popup, const char *emission, const char *source) {
+        _outside_clicked_cb(nullptr, popup, emission, source);
+      },
+      nullptr);
   Evas_Object *box = elm_box_add(menu);
   _add_buttons(ad, menu, box, "tavro_menu", entries);
   elm_object_content_set(menu, box);
@@ -110,10 +114,10 @@ Evas_Object *tavro_menu_show(appdata *ad, Evas_Object **slot, std::initializer_l
 
 void tavro_delete_all_popup(appdata *ad) {
   Evas_Object **const slots[] = {
-      &ad->version_popup,    &ad->delete_fd_popup, &ad->delete_popup,     &ad->history_edit_popup,
+      &ad->version_popup,      &ad->delete_fd_popup, &ad->delete_popup,     &ad->history_edit_popup,
       &ad->history_file_popup, &ad->settings_popup,  &ad->imgedit_popup,    &ad->cancel_popup,
-      &ad->connection_popup, &ad->crash_popup,     &ad->signout_popup,    &ad->crashpopup_win,
-      &ad->cpmgr_popup,      &ad->quit_beta_popup, &ad->next_steps_popup, &ad->corvane_account_optin_popup,
+      &ad->connection_popup,   &ad->crash_popup,     &ad->signout_popup,    &ad->crashpopup_win,
+      &ad->cpmgr_popup,        &ad->quit_beta_popup, &ad->next_steps_popup, &ad->corvane_account_optin_popup,
       &ad->opt_out_popup,
   };
   for (Evas_Object **slot : slots)

@@ -78,13 +78,15 @@ Elm_Genlist_Item_Class *_row_class_new(const char *style) {
 }
 
 void _append_section(category_view_win *view, Evas_Object *list, const char *title) {
-  Elm_Object_Item *item = elm_genlist_item_append(list, view->section_class, _row_new(title, nullptr, nullptr),
-                                                  nullptr, ELM_GENLIST_ITEM_NONE, nullptr, nullptr);
+  Elm_Object_Item *item =
+      elm_genlist_item_append(list, view->section_class, _row_new(title, nullptr, nullptr), nullptr,
+                              ELM_GENLIST_ITEM_NONE, nullptr, nullptr);
   elm_genlist_item_select_mode_set(item, ELM_OBJECT_SELECT_MODE_DISPLAY_ONLY);
 }
 
 void _append_target(category_view_win *view, Evas_Object *list, target_row *row) {
-  elm_genlist_item_append(list, view->target_class, row, nullptr, ELM_GENLIST_ITEM_NONE, _row_selected_cb, view);
+  elm_genlist_item_append(list, view->target_class, row, nullptr, ELM_GENLIST_ITEM_NONE, _row_selected_cb,
+                          view);
 }
 
 struct list_filling {

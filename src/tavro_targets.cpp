@@ -3,9 +3,8 @@
 #include <cstring>
 
 const tavro_target_category kTargetCategories[] = {
-    {"IDS_OB_MBODY_BATTERY", "battery"}, {"Hardware", "chip"},
-    {"IDS_OB_MBODY_NETWORK", "network"}, {"IDS_OB_SOFTWARE_UPDATE", "update"},
-    {"Performance", "gauge"},            {"IDS_OB_BODY_SOMETHING_ELSE", "chat"},
+    {"IDS_OB_MBODY_BATTERY", "battery"},  {"Hardware", "chip"},     {"IDS_OB_MBODY_NETWORK", "network"},
+    {"IDS_OB_SOFTWARE_UPDATE", "update"}, {"Performance", "gauge"}, {"IDS_OB_BODY_SOMETHING_ELSE", "chat"},
 };
 const size_t kTargetCategoryCount = sizeof kTargetCategories / sizeof *kTargetCategories;
 

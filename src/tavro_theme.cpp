@@ -62,4 +62,6 @@ bool tavro_theme_load() {
   return true;
 }
 
-const char *tavro_theme_danger_colour() { return _is_dark ? "#FF8A80" : "#C62828"; }
+const char *tavro_theme_danger_colour() {
+  return _is_dark ? "#FF8A80" : "#C62828";
+}

@@ -46,7 +46,8 @@ Evas_Object *tavro_layout_add(Evas_Object *parent, const char *group) {
 }
 
 void tavro_layout_text_set(Evas_Object *layout, const char *part, const char *text) {
-  const Evas_Object *shown = edje_object_part_object_get(elm_layout_edje_get(layout), part ? part : "elm.text");
+  const Evas_Object *shown =
+      edje_object_part_object_get(elm_layout_edje_get(layout), part ? part : "elm.text");
   const char *type = shown ? evas_object_type_get(shown) : nullptr;
   const bool is_markup = type && std::strcmp(type, "textblock") == 0;
   elm_object_part_text_set(layout, part, is_markup ? tavro_markup(text).c_str() : text);
@@ -135,8 +136,8 @@ Evas_Object *tavro_page_add(appdata *ad, const char *title, const char *start_ic
   return page;
 }
 
-Evas_Object *tavro_page_action_add(Evas_Object *page, const char *icon, const char *name, Evas_Smart_Cb clicked,
-                                   const void *data) {
+Evas_Object *tavro_page_action_add(Evas_Object *page, const char *icon, const char *name,
+                                   Evas_Smart_Cb clicked, const void *data) {
   Evas_Object *box = _actions_box(page);
   Evas_Object *content = tavro_icon_add(box, (std::string(icon) + "/on").c_str());
   Evas_Object *button = tavro_button_add(box, "tavro_icon", nullptr, content, name, clicked, data);

@@ -203,12 +203,16 @@ TEST(Battery, ChangeOfCapacityIsReportedOncePerPercent) {
   ASSERT_EQ(device_add_callback(DEVICE_CALLBACK_BATTERY_CAPACITY, callback, nullptr), 0);
   EXPECT_EQ(device_add_callback(DEVICE_CALLBACK_BATTERY_CAPACITY, callback, nullptr),
             DEVICE_ERROR_ALREADY_IN_PROGRESS);
-  for (const char *percentage : {"16.4", "16.2", "15.0"}) {
+  const auto report = [&service](const char *percentage) {
     const std::string change =
         std::string("('org.freedesktop.UPower.Device', {'Percentage': <") + percentage + ">}, @as [])";
     service.emit("/org/freedesktop/UPower/devices/DisplayDevice", "org.freedesktop.DBus.Properties",
                  "PropertiesChanged", change.c_str());
-  }
+  };
+  // What is said before the subscription is in force reaches nobody.
+  EXPECT_TRUE(wait_for([&] { return report("16.4"), !capacities.empty(); }, 5));
+  report("16.2");
+  report("15.0");
   EXPECT_TRUE(wait_for([] { return capacities.size() >= 2; }, 5));
   EXPECT_THAT(capacities, ElementsAre(16, 15));
   EXPECT_EQ(device_remove_callback(DEVICE_CALLBACK_BATTERY_CAPACITY, callback), 0);

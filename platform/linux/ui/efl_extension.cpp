@@ -49,7 +49,9 @@ bool serve_key(Eext_Callback_Type type) {
   return true;
 }
 
-bool is_back_key(const std::string &key) { return key == "Escape" || key == "XF86Back"; }
+bool is_back_key(const std::string &key) {
+  return key == "Escape" || key == "XF86Back";
+}
 
 // The desktop's toolkit pops a naviframe by itself when Escape goes down; a key that somebody asked for is
 // kept from it, or one press would go back twice.
