@@ -134,6 +134,14 @@ class Screen:
         except GLib.Error:
             return False
 
+    def _shown_name(self, node):
+        from gi.repository import GLib
+        try:
+            is_shown = node.get_state_set().contains(self.atspi.StateType.SHOWING)
+            return node.get_name() if is_shown else ""
+        except GLib.Error:
+            return ""
+
     def look(self, name, role=None):
         """The first node that is shown under this name now, or None."""
         return next((node for node in self._nodes() if self._matches(node, name, role)), None)
@@ -149,8 +157,7 @@ class Screen:
 
     def names(self):
         """The names of all that is shown, in reading order."""
-        return [node.get_name() for node in self._nodes()
-                if node.get_name() and self._matches(node, node.get_name(), None)]
+        return [name for name in (self._shown_name(node) for node in self._nodes()) if name]
 
     def activate(self, name, role=None, timeout=10.0):
         """Do what a tap on the control does."""
