@@ -47,6 +47,7 @@ constexpr const char *kNotificationConfig = R"([global]
     format = "<b>%%s</b>\n%%b"
     alignment = left
     word_wrap = yes
+    icon_path = "%s"
     icon_position = left
     min_icon_size = %d
     max_icon_size = %d
@@ -80,11 +81,19 @@ std::string cookie_file() {
   return file.append(cookie, sizeof cookie);
 }
 
+// Where the client's icon is.
+std::string client_folder() {
+  TavroGText bin(g_path_get_dirname(application_program(kClientId).c_str()));
+  TavroGText folder(g_path_get_dirname(bin.get()));
+  return folder.get();
+}
+
 std::string notification_config(const ScreenSize &size) {
   const double scale = size.width / kUnitsPerWidth;
   const auto units = [scale](int count) { return static_cast<int>(count * scale + 0.5); };
   TavroGText text(g_strdup_printf(kNotificationConfig, units(332), units(120), units(8), units(12), units(16),
-                                  units(8), units(12), units(11), units(24), units(32)));
+                                  units(8), units(12), units(11), client_folder().c_str(), units(24),
+                                  units(32)));
   return text.get();
 }
 
@@ -157,13 +166,6 @@ void use_virtual_display(Environment *environment, const Folder &folder, const S
   environment->set("XAUTHORITY", folder.run("xauthority"));
   environment->set("ELM_SCALE", scale);
   environment->set("ELM_ACCEL", "none");
-}
-
-bool has_notification_daemon(const std::string &address) {
-  if (address.empty()) return false;
-  std::string reason;
-  TavroObject<GDBusConnection> bus = connect_to_bus(address, &reason);
-  return bus && start_by_name(bus.get(), "org.freedesktop.Notifications", &reason);
 }
 
 }  // namespace phone

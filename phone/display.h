@@ -34,7 +34,4 @@ std::vector<std::string> notification_command(const Folder &folder);
 void use_virtual_display(Environment *environment, const Folder &folder, const ScreenSize &size,
                          const std::string &number);
 
-// Whether a notification daemon runs, or would start, on the bus at `address`; false when it is empty.
-bool has_notification_daemon(const std::string &address);
-
 }  // namespace phone

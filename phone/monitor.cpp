@@ -44,7 +44,9 @@ bool start_inner_half(Monitor *monitor, int inner_end, int lock) {
       sandboxed(monitor->options->mode, monitor->options->folder, supervise_command(*monitor->options));
   // Standard output and error are those of all the phone's programs; what the person is told goes apart.
   const TavroFd output = open_output(monitor->options->folder, O_TRUNC);
-  const int sources[] = {inner_end, lock, STDERR_FILENO};
+  // A copy, because the child's standard error is replaced before the others are handed over.
+  const TavroFd terminal(fcntl(STDERR_FILENO, F_DUPFD_CLOEXEC, kTerminal + 1));
+  const int sources[] = {inner_end, lock, terminal.get()};
   const int targets[] = {kLifeLine, kLockHandle, kTerminal};
   const auto flags = static_cast<GSpawnFlags>(G_SPAWN_SEARCH_PATH | G_SPAWN_DO_NOT_REAP_CHILD);
   TavroError error;

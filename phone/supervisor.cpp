@@ -201,12 +201,12 @@ void Supervisor::note_bus_line(const std::string &line) {
 
 bool Supervisor::start_helpers() {
   const Folder &folder = options_.folder;
-  if (has_virtual_display_ &&
-      !add_program({"the window manager", window_manager_command(folder), environment_, nullptr, nullptr}))
-    return false;
-  // Notifications go to the desktop where it shows them; the virtual display has a daemon of its own.
-  if (has_virtual_display_ && !has_notification_daemon(environment_.get("TAVRO_HOST_SESSION_BUS")))
+  if (has_virtual_display_) {
+    if (!add_program({"the window manager", window_manager_command(folder), environment_, nullptr, nullptr}))
+      return false;
+    // A desktop shows notifications itself. Without this one a phone works, but says less.
     add_program({"the notification daemon", notification_command(folder), environment_, nullptr, nullptr});
+  }
   open_accessibility();
   return true;
 }

@@ -132,8 +132,8 @@ def test_a_phone_that_lost_a_vital_part_is_gone_and_can_be_started_again(phone, 
         state = (phone.directory / "run" / "state").read_text()
         os.kill(int(state.split("\npid=")[1].split()[0]), signal.SIGKILL)
     else:
-        pid = 2 if part == "inner half" else phone.status()[part]
-        phone.execute("kill", "-9", str(pid), check=False)
+        pid = "$PPID" if part == "inner half" else phone.status()[part]
+        phone.execute("sh", "-c", f"kill -9 {pid}", check=False)
     wait_until(lambda: not processes_of(phone), what="end of all processes")
     phone.start()
     assert CLIENT in phone.status()
@@ -258,6 +258,15 @@ def test_ctrl_c_ends_a_phone_in_the_foreground_in_order(phone):
     assert running.wait(10) == 0 and events(phone)[-1] == ["terminate"] and processes_of(phone) == []
 
 
+@pytest.mark.parametrize("options", [[], ["--detach"]])
+def test_a_phone_that_cannot_start_says_why(phone, program, tmp_path, options):
+    (tmp_path / "bin").mkdir()
+    phone.program = shutil.copy(program, tmp_path / "bin")  # with no desk beside it
+    result = phone.command("start", "--headless", *options, check=False)
+    assert result.returncode == 1 and "the desk cannot be started" in result.stderr
+    wait_until(lambda: not processes_of(phone), what="end of all processes")
+
+
 def in_place(command, storage):
     """`command` on a machine where no sandbox can be made and whose /opt/usr is `storage`."""
     return ["bwrap", "--dev-bind", "/", "/", "--tmpfs", "/opt", *storage, "--setenv", "TAVRO_PHONE_NO_SANDBOX",
@@ -298,7 +307,7 @@ def desktop(tmp_path):
     display = subprocess.Popen(["Xvfb", "-displayfd", str(write_end), "-screen", "0", "1000x800x24"],
                                pass_fds=[write_end], stderr=subprocess.DEVNULL)
     bus = subprocess.Popen(["dbus-daemon", "--session", "--nofork", "--print-address"], stdout=subprocess.PIPE,
-                           text=True, env={**os.environ, "XDG_RUNTIME_DIR": str(tmp_path)},
+                           text=True, env={**os.environ, "XDG_RUNTIME_DIR": str(tmp_path), "GSETTINGS_BACKEND": "memory"},
                            stderr=subprocess.DEVNULL)
     os.close(write_end)
     number = os.read(read_end, 16).decode().strip()

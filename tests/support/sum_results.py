@@ -16,7 +16,7 @@ def cases(path):
 
 def main(folder):
     whole_runs = [folder / "ctest.xml", folder / "pytest.xml"]
-    missing = [path.name for path in whole_runs if not path.exists()]
+    missing = [path.name for path in whole_runs if not path.exists() or not any(cases(path))]
     programs = {path.stem: [failed for _, failed in cases(path)]
                 for path in folder.glob("*.xml") if path not in whole_runs}
     outcomes = [failed for _, failed in cases(folder / "pytest.xml")] if "pytest.xml" not in missing else []
