@@ -27,21 +27,23 @@ constexpr const char *kWindowManagerConfig = R"(<?xml version="1.0" encoding="UT
 </openbox_config>
 )";
 
-// One card at the top of the screen, in the client's colours. Sizes follow the screen.
+// Cards across the top of the screen, in the client's colours; there is no compositor, so their corners are
+// square and nothing lies between them. Sizes follow the screen.
 constexpr const char *kNotificationConfig = R"([global]
     follow = none
     width = %d
     height = %d
     origin = top-center
-    offset = 0x%d
-    notification_limit = 3
+    offset = 0x0
+    notification_limit = 2
+    indicate_hidden = no
+    show_indicators = no
+    ellipsize = end
     padding = %d
     horizontal_padding = %d
-    frame_width = 1
+    frame_width = 2
     frame_color = "#E1E6ED"
     separator_color = frame
-    gap_size = %d
-    corner_radius = %d
     font = Noto Sans %d
     markup = full
     format = "<b>%%s</b>\n%%b"
@@ -57,11 +59,11 @@ constexpr const char *kNotificationConfig = R"([global]
 [urgency_low]
     background = "#FFFFFF"
     foreground = "#1B2430"
-    timeout = 6
+    timeout = 4
 [urgency_normal]
     background = "#FFFFFF"
     foreground = "#1B2430"
-    timeout = 6
+    timeout = 4
 [urgency_critical]
     background = "#FFFFFF"
     foreground = "#C62828"
@@ -91,9 +93,8 @@ std::string client_folder() {
 std::string notification_config(const ScreenSize &size) {
   const double scale = size.width / kUnitsPerWidth;
   const auto units = [scale](int count) { return static_cast<int>(count * scale + 0.5); };
-  TavroGText text(g_strdup_printf(kNotificationConfig, units(332), units(120), units(8), units(12), units(16),
-                                  units(8), units(12), units(11), client_folder().c_str(), units(24),
-                                  units(32)));
+  TavroGText text(g_strdup_printf(kNotificationConfig, size.width - 4, units(160), units(12), units(16),
+                                  units(11), client_folder().c_str(), units(24), units(32)));
   return text.get();
 }
 

@@ -19,8 +19,10 @@ class Demo:
         self.folder.mkdir(parents=True, exist_ok=True)
         self.step = 0
 
-    def say(self, phone, what):
+    def say(self, phone, what, with_notifications=False):
         self.step += 1
+        if not with_notifications:
+            phone.close_notifications()
         path = phone.screenshot(self.folder / f"{self.step:02d}.png")
         print(f"{self.step:2d}. {what}: {path}", flush=True)
 
@@ -30,7 +32,7 @@ class Demo:
         road.attach("morning.png", "banner.jpg")
         self.say(road.phone, "two pictures attached")
         road.send()
-        self.say(road.phone, "sent; the phone says that it is sending")
+        self.say(road.phone, "sent; the phone says so", with_notifications=True)
         report = road.arrived(TITLE)
         pictures = road.desk.pictures(report["id"])
         assert len(pictures) == 2, f"the desk's page shows {len(pictures)} pictures"
@@ -43,7 +45,8 @@ class Demo:
         road.desk.answer(number, IN_PROCESS, REPLY)
         (self.folder / "desk.html").write_text(road.desk.page(f"/staff/reports/{number}"))
         road.wait_for_row(TITLE, "In process")
-        self.say(road.phone, "support answered; the history shows it without being reopened")
+        self.say(road.phone, "support answered; the phone notifies", with_notifications=True)
+        self.say(road.phone, "the history shows it without being reopened")
         road.back()
         road.screen.wait_for("My Reports")
         wait_until(lambda: road.screen.description("My Reports") == "1 new answer", 10, "the badge counting 1")

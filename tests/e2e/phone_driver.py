@@ -81,6 +81,12 @@ class Phone:
         self.command("screenshot", str(path))
         return pathlib.Path(path)
 
+    def close_notifications(self):
+        """Put the notifications away that lie over the phone's screen."""
+        self.execute("gdbus", "call", "--session", "-d", "org.freedesktop.Notifications", "-o",
+                     "/org/freedesktop/Notifications", "-m", "org.dunstproject.cmd0.NotificationCloseAll", check=False)
+        time.sleep(0.2)  # until the display has painted what lay below
+
     def log(self):
         return self.command("log").stdout
 

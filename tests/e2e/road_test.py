@@ -85,7 +85,7 @@ def test_demo_plays_the_road_to_its_end(tmp_path):
     result = subprocess.run([sys.executable, "-W", "ignore", str(ROOT / "tests/e2e/demo.py"), str(tmp_path)],
                             capture_output=True, text=True, env=environment, timeout=180)
     assert result.returncode == 0, result.stdout + result.stderr
-    assert len(list(tmp_path.glob("*.png"))) == 12
+    assert len(list(tmp_path.glob("*.png"))) == 13
 
 
 def test_every_control_has_a_name(road):
