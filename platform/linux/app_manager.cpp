@@ -20,15 +20,20 @@ namespace {
 using namespace platform;
 
 constexpr const char *kSuffix = ".desktop";
-// Large first: lists show icons at 48 to 96 pixels, and shrinking looks better than stretching.
-constexpr const char *kIconFolders[] = {"icons/hicolor/128x128/apps",  "icons/hicolor/256x256/apps",
-                                        "icons/hicolor/96x96/apps",    "icons/hicolor/64x64/apps",
-                                        "icons/hicolor/scalable/apps", "icons/hicolor/48x48/apps",
-                                        "icons/hicolor/32x32/apps",    "pixmaps"};
-constexpr const char *kIconEndings[] = {".png", ".svg", ".xpm", ""};
+// Large first: lists show icons at 48 to 96 pixels, and shrinking looks better than stretching. Scalable
+// icons are left out: Debian's toolkit reads no SVG.
+constexpr const char *kIconFolders[] = {"icons/hicolor/128x128/apps",
+                                        "icons/hicolor/256x256/apps",
+                                        "icons/hicolor/96x96/apps",
+                                        "icons/hicolor/64x64/apps",
+                                        "icons/hicolor/48x48/apps",
+                                        "icons/hicolor/32x32/apps",
+                                        "pixmaps"};
+constexpr const char *kIconEndings[] = {".png", ".xpm", ""};
 
-bool is_readable(const std::string &path) {
-  return g_file_test(path.c_str(), G_FILE_TEST_IS_REGULAR) && access(path.c_str(), R_OK) == 0;
+bool is_usable(const std::string &path) {
+  return !g_str_has_suffix(path.c_str(), ".svg") && g_file_test(path.c_str(), G_FILE_TEST_IS_REGULAR) &&
+         access(path.c_str(), R_OK) == 0;
 }
 
 std::vector<std::string> data_folders() {
@@ -44,7 +49,7 @@ std::string find_themed_icon(const std::string &name) {
     for (const char *folder : kIconFolders) {
       for (const char *ending : kIconEndings) {
         const std::string path = data + "/" + folder + "/" + name + ending;
-        if (is_readable(path)) return path;
+        if (is_usable(path)) return path;
       }
     }
   }
@@ -54,7 +59,7 @@ std::string find_themed_icon(const std::string &name) {
 std::string icon_path(GIcon *icon) {
   if (G_IS_FILE_ICON(icon)) {
     const ScopedGText path(g_file_get_path(g_file_icon_get_file(G_FILE_ICON(icon))));
-    return path && is_readable(path.get()) ? path.get() : "";
+    return path && is_usable(path.get()) ? path.get() : "";
   }
   if (!G_IS_THEMED_ICON(icon)) return "";
   for (const char *const *name = g_themed_icon_get_names(G_THEMED_ICON(icon)); *name; ++name) {
