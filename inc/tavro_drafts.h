@@ -55,9 +55,11 @@ constexpr size_t kGeneratedFilenameSize = 4096;
 int tavro_save_problem_compose_data(appdata *ad, int status);
 int tavro_save_idea_compose_data(appdata *ad, int status);
 
-// The Done action and the "save as draft" entry, from either compose screen: remove the draft that the screen
-// was opened from and an automatically saved copy, then save. `type` decides which saver runs. Sending a
-// problem report above the size limit stores nothing, posts a toast and returns -1 with the screen untouched.
+// The Done action and the "save as draft" entry, from either compose screen: save, and when the new record is
+// stored remove the draft that the screen was opened from and an automatically saved copy, so that neither a
+// full disk nor an end in between loses what was stored before. `type` decides which saver runs. Below 1:
+// nothing was stored and the screen is as it was; -1 with a toast when a problem report is above the size
+// limit.
 int tavro_send_compose_data(appdata *ad);
 int tavro_save_compose_draft(appdata *ad);
 

@@ -20,7 +20,6 @@ void tavro_load_url(appdata *ad, int in_background);
 // Account pages of the maker's account.
 void tavro_create_account_page_ui(appdata *ad, GSList *accounts);
 int tavro_add_account_result(appdata *ad);
-void tavro_refresh_account_page_items(appdata *ad);
 
 // Crash reports and the share menu.
 void tavro_show_crash_report(appdata *ad);

@@ -15,6 +15,8 @@ void tavro_update_landing_page_history_badge(appdata *ad);
 
 // Welcome and account choice, shown until an account is stored in "tavro_username".
 void tavro_create_account_page(appdata *ad);
+// Read the phone's accounts anew; nothing when the page is not open.
+void tavro_refresh_account_page_items(appdata *ad);
 
 // Compose screens. A non-null draft fills the screen and sets id_to_delete.
 void tavro_create_problem_page(appdata *ad, const svc_voc_data *draft);

@@ -19,6 +19,10 @@
 namespace {
 
 constexpr int kMaxNameLength = 120;
+constexpr char kTitle[] = "Select account";  // fixed: coming back to the application looks for it
+
+struct account_page;
+account_page *_open_page = nullptr;  // there is one at most
 
 struct account_page {
   appdata *ad;
@@ -127,6 +131,7 @@ void _continue_clicked_cb(void *data, Evas_Object *, void *) {
 void _page_deleted_cb(void *data, Evas *, Evas_Object *, void *) {
   account_page *view = static_cast<account_page *>(data);
   tavro_free_account_list(view->accounts);
+  _open_page = nullptr;
   view->ad->account_layout = nullptr;
   TAVRO_FREE(view);
 }
@@ -154,9 +159,28 @@ void _build_list(account_page *view) {
 
 }  // namespace
 
+void tavro_refresh_account_page_items(appdata *) {
+  account_page *view = _open_page;
+  if (!view) return;
+  const TavroText chosen(view->chosen ? TAVRO_STRDUP(view->chosen->user_name) : nullptr);
+  tavro_free_account_list(view->accounts);
+  view->accounts = tavro_find_mail_id();
+  tavro_account_disconnect_db();
+  // A name that is being typed stays; only a choice among the accounts is shown anew.
+  if (!chosen) return;
+  view->chosen = nullptr;
+  for (const GSList *link = view->accounts; link && !view->chosen; link = link->next) {
+    const auto *account = static_cast<const tavro_account_info *>(link->data);
+    if (g_strcmp0(account->user_name, chosen.get()) == 0) view->chosen = account;
+  }
+  if (!view->chosen && view->accounts)
+    view->chosen = static_cast<const tavro_account_info *>(view->accounts->data);
+  _show_rows(view);
+}
+
 void tavro_create_account_page(appdata *ad) {
   if (!ad->nf || ad->account_layout) return;
-  account_page *view = TAVRO_ZALLOC(account_page);
+  account_page *view = _open_page = TAVRO_ZALLOC(account_page);
   view->ad = ad;
   view->accounts = tavro_find_mail_id();
   tavro_account_disconnect_db();
@@ -169,7 +193,7 @@ void tavro_create_account_page(appdata *ad) {
   Evas_Object *button = tavro_button_add(view->page, "tavro_primary", tavro_text("IDS_OB_BUTTON_CONTINUE"),
                                          nullptr, nullptr, _continue_clicked_cb, view);
   elm_object_part_content_set(view->page, "tavro.swallow.button", button);
-  Elm_Object_Item *item = tavro_page_push(ad, view->page, tavro_text("IDS_OB_HEADER_REPORT_AS"));
+  Elm_Object_Item *item = tavro_page_push(ad, view->page, kTitle);
   elm_naviframe_item_pop_cb_set(
       item,
       [](void *, Elm_Object_Item *) -> Eina_Bool {

@@ -53,7 +53,7 @@ void _free_compose_views(appdata *ad) {
 
 void tavro_initialize_application_data(appdata *ad) {
   is_ending = false;
-  // All other start values are zero, as main leaves the record.
+  *ad = {};
   ad->add_video_to_tavro = 1;
   ad->comm_url_type = TAVRO_COMMUNITY_MAX;
   ad->rType = INITIAL;

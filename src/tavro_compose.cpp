@@ -77,10 +77,15 @@ void _forget_view(appdata *ad) {
   }
 }
 
-void _leave(appdata *ad) {
+// The screen ends without a new record: its automatic copy goes with it, and so does, when the person says
+// "discard", the draft that it was opened from.
+void _end_without_record(appdata *ad, bool with_draft) {
+  if (ad->auto_saved_id >= 1) tavro_dbmgr_destroy_vocs_by_id(ad->auto_saved_id);
+  if (with_draft && ad->id_to_delete >= 1) tavro_dbmgr_destroy_vocs_by_id(ad->id_to_delete);
+  ad->auto_saved_id = 0;
   ad->id_to_delete = 0;
   tavro_autosave_stop();
-  tavro_pop_naviframe_middle_items(ad);
+  _forget_view(ad);
 }
 
 // A save that fails leaves the screen as it is; one that was refused for its size has said so itself.
@@ -96,13 +101,13 @@ void _save_draft(appdata *ad) {
 }
 
 void _discard(appdata *ad) {
-  _forget_view(ad);
-  _leave(ad);
+  _end_without_record(ad, true);
+  tavro_pop_naviframe_middle_items(ad);
 }
 
 void _ask_before_leaving(appdata *ad) {
   tavro_popup_show(ad, &ad->cancel_popup, tavro_text("IDS_OB_HEADER_KEEP_DRAFT"),
-                   tavro_text("IDS_OB_BODY_KEEP_DRAFT"),
+                   tavro_text(ad->id_to_delete >= 1 ? "IDS_OB_BODY_KEEP_CHANGES" : "IDS_OB_BODY_KEEP_DRAFT"),
                    {{tavro_text("IDS_OB_BUTTON_STAY"), nullptr},
                     {tavro_text("IDS_OB_BUTTON_DISCARD"), _discard},
                     {tavro_text("IDS_OB_BUTTON_SAVE_DRAFT"), _save_draft}});
@@ -111,9 +116,7 @@ void _ask_before_leaving(appdata *ad) {
 Eina_Bool _pop_cb(void *data, Elm_Object_Item *) {
   appdata *ad = static_cast<appdata *>(data);
   if (!_would_lose_something(tavro_compose_view(ad))) {
-    _forget_view(ad);
-    ad->id_to_delete = 0;
-    tavro_autosave_stop();
+    _end_without_record(ad, false);
     return EINA_TRUE;
   }
   _ask_before_leaving(ad);
@@ -232,8 +235,9 @@ Evas_Object *_build_content(appdata *ad, compose_view_win *view, const char *hin
 
 void _build_page(appdata *ad, compose_view_win *view, const svc_voc_data *draft, const char *title,
                  const char *hint) {
+  ad->auto_saved_id = 0;
+  ad->id_to_delete = draft ? draft->id : 0;
   if (draft) {
-    ad->id_to_delete = draft->id;
     view->app_name = draft->app_name && *draft->app_name ? TAVRO_STRDUP(draft->app_name) : nullptr;
     view->app_icon = draft->app_icon && *draft->app_icon ? TAVRO_STRDUP(draft->app_icon) : nullptr;
   }

@@ -5,9 +5,9 @@
 #include <sys/stat.h>
 
 #include <algorithm>
-#include <cstdlib>
 
 #include "tavro_handles.h"
+#include "tavro_memory.h"
 
 namespace {
 
@@ -63,8 +63,8 @@ std::vector<std::string> tavro_gallery_pictures() {
   std::vector<std::string> folders{kMediaFolder};
   char *pictures = nullptr;
   if (storage_get_directory(0, STORAGE_DIRECTORY_IMAGES, &pictures) == STORAGE_ERROR_NONE && pictures) {
+    const TavroText owned(TAVRO_ADOPT(pictures));
     const std::string path = pictures;
-    std::free(pictures);
     if (path.compare(0, sizeof kMediaFolder - 1, kMediaFolder) != 0) folders.push_back(path);
   }
   return tavro_gallery_pictures_in(folders);

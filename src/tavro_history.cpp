@@ -205,8 +205,8 @@ void tavro_edit_cb(appdata *ad, const svc_voc_data *draft) {
 }
 
 void tavro_update_history_page(app_control_h, appdata *ad) {
-  if (!ad->history_ad) return;
   TAVRO_LOGD("Called for status update from svc");
+  if (!ad->history_ad) return;
   const TavroText user_name = tavro_get_username_from_preference();
   if (user_name) _show_reports(ad, user_name.get());
 }

@@ -33,10 +33,6 @@ int tavro_add_account_result(appdata *) {
   return 0;
 }
 
-void tavro_refresh_account_page_items(appdata *) {
-  TAVRO_NOT_YET("refreshing the account choice");
-}
-
 void tavro_show_crash_report(appdata *) {
   TAVRO_NOT_YET("crash reports");
 }

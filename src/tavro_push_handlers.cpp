@@ -64,7 +64,8 @@ void tavro_handle_community_replies(appdata *ad) {
   tavro_refresh_beta_pages(ad, "the badge of the community pages");
 }
 
-void tavro_handle_banner_info(app_control_h, appdata *ad) {
+void tavro_handle_banner_info(app_control_h service, appdata *ad) {
+  _log_request(service);
   tavro_refresh_banners(ad);
 }
 

@@ -8,6 +8,7 @@
 #include "tavro_handles.h"
 #include "tavro_history_text.h"
 #include "tavro_log.h"
+#include "tavro_preferences.h"
 #include "tavro_save_journal.h"
 #include "tavro_service_bridge.h"
 
@@ -33,13 +34,15 @@ void tavro_prepare_store() {
   is_prepared = true;
   const tavro_dbmgr_store_state state = tavro_dbmgr_ensure_schema();
   if (state == TAVRO_STORE_UNUSABLE) return;
-  replacement_is_untold = state == TAVRO_STORE_REPLACED;
+  replacement_is_untold =
+      state == TAVRO_STORE_REPLACED || tavro_preference_flag(TAVRO_PREF_STORE_REPLACED, false);
   _finish_interrupted_save();
 }
 
 void tavro_tell_store_was_replaced(appdata *ad) {
   if (!replacement_is_untold || !ad->win) return;
   replacement_is_untold = false;
+  preference_remove(TAVRO_PREF_STORE_REPLACED);
   tavro_popup_show(ad, &ad->history_file_popup, tavro_text("IDS_OB_HEADER_REPORTS_NOT_READABLE"),
                    tavro_text("IDS_OB_POP_REPORTS_NOT_READABLE_SET_ASIDE"),
                    {{tavro_text("IDS_OB_BUTTON_OK"), nullptr}});

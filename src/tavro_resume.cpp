@@ -9,6 +9,7 @@
 #include "tavro_log.h"
 #include "tavro_not_yet.h"
 #include "tavro_preferences.h"
+#include "tavro_screens.h"
 #include "tavro_service_bridge.h"
 
 namespace {

@@ -1,5 +1,7 @@
 #include "svc_uploader.h"
 
+#include <app_preference.h>
+
 #include <algorithm>
 #include <set>
 
@@ -16,7 +18,11 @@ bool _waits_to_be_sent(int status) {
 
 bool _is_store_ready() {
   static bool is_ready = false;
-  if (!is_ready) is_ready = tavro_dbmgr_ensure_schema() != TAVRO_STORE_UNUSABLE;
+  if (is_ready) return true;
+  const tavro_dbmgr_store_state state = tavro_dbmgr_ensure_schema();
+  // The client tells the person, at its next start.
+  if (state == TAVRO_STORE_REPLACED) preference_set_boolean("tavro_store_replaced", true);
+  is_ready = state != TAVRO_STORE_UNUSABLE;
   return is_ready;
 }
 
@@ -105,7 +111,9 @@ void SvcUploader::tell_failure(int voc_id, int status) {
   const SvcVoc voc(tavro_dbmgr_get_voc_by_id(voc_id));
   if (!voc) return;
   if (!state_.is_announced(voc_id)) state_.announce_failure(voc_id);
-  if (svc_last_status(*voc) != status) tavro_dbmgr_update_sending_state(voc_id, status);
+  const int shown = svc_last_status(*voc);
+  // A draft stays one until it is at the desk; that it is to be sent is kept in the service's own state.
+  if (shown != status && shown != TAVRO_STATUS_DRAFT_SAVED) tavro_dbmgr_update_sending_state(voc_id, status);
   messages_.deliver();
 }
 

@@ -68,11 +68,27 @@ constexpr const char *kCountIndexes =
     "SELECT count(*) FROM sqlite_master WHERE type = 'index' AND name IN ('VOC_BY_USER_AND_CHANGE', "
     "'VOC_EXTENDED_BY_VOC', 'ATTACHMENT_BY_VOC');";
 
+constexpr char kSeedBannerRow[] = "BANNER_ID = 0 AND BANNER_SEQ_NO = 0";
+
+std::string _seed_banner_image() {
+  const TavroText folder(TAVRO_ADOPT(app_get_resource_path()));
+  return std::string(folder ? folder.get() : "") + "/images/kxbanner2.jpg";
+}
+
 void _set_seed_banner_image(sqlite3 *db, const char *where) {
-  TavroText folder(TAVRO_ADOPT(app_get_resource_path()));
-  const TavroGText image(g_strdup_printf("%s/%s", folder ? folder.get() : "", "images/kxbanner2.jpg"));
-  folder.reset();
-  _tavro_dbmgr_update_record(db, "TABLE_BANNER", "BANNER_IMAGE_PATH", image.get(), where);
+  _tavro_dbmgr_update_record(db, "TABLE_BANNER", "BANNER_IMAGE_PATH", _seed_banner_image().c_str(), where);
+}
+
+// The picture comes with the client alone. When the upload service made the store, the client puts its own
+// path.
+bool _owns_seed_banner_image() {
+  return access(_seed_banner_image().c_str(), R_OK) == 0;
+}
+
+bool _is_seed_banner_image_known(sqlite3 *db) {
+  if (!_owns_seed_banner_image()) return true;
+  const TavroText stored(_tavro_dbmgr_get_col_data(db, "TABLE_BANNER", "BANNER_IMAGE_PATH", kSeedBannerRow));
+  return stored && _seed_banner_image() == stored.get();
 }
 
 enum class contents { complete, incomplete, empty, not_a_database, unreadable };
@@ -87,8 +103,9 @@ contents _inspect() {
                                                              : contents::unreadable;
   }
   if (table_count == 0) return contents::empty;
-  const bool is_complete =
-      table_count == kTableCount && store_read_number(db.get(), kCountIndexes, 0) == kIndexCount;
+  const bool is_complete = table_count == kTableCount &&
+                           store_read_number(db.get(), kCountIndexes, 0) == kIndexCount &&
+                           _is_seed_banner_image_known(db.get());
   return is_complete ? contents::complete : contents::incomplete;
 }
 
@@ -99,7 +116,10 @@ void _add_what_is_missing() {
   for (const char *sql : kTablesBeforeBanner) store_execute(db.get(), sql);
   if (store_read_number(db.get(), "SELECT count(*) FROM TABLE_BANNER WHERE BANNER_SEQ_NO = 0;", 1) == 0)
     store_execute(db.get(), kSeedBanner);
-  _set_seed_banner_image(db.get(), "BANNER_SEQ_NO = 0 AND BANNER_IMAGE_PATH = ''");
+  if (_owns_seed_banner_image())
+    _set_seed_banner_image(db.get(), kSeedBannerRow);
+  else
+    _set_seed_banner_image(db.get(), "BANNER_SEQ_NO = 0 AND BANNER_IMAGE_PATH = ''");
   store_execute(db.get(), kTableAfterBanner);
   for (const char *sql : kIndexes) store_execute(db.get(), sql);
 }

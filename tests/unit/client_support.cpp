@@ -251,6 +251,7 @@ void push_page(appdata *ad, const char *name) {
 void tavro_create_landing_page(appdata *ad) {
   push_page(ad, "landing");
 }
+RECORD(tavro_refresh_account_page_items(appdata *), "refresh accounts")
 void tavro_create_account_page(appdata *ad) {
   push_page(ad, "account");
 }
