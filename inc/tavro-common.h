@@ -17,8 +17,13 @@ const char *tavro_text(const char *id);
 // window can be had (no display).
 bool tavro_create_base_window(appdata *ad);
 
-// What decides whether the window's close button may end the application; null: it always may.
-void tavro_set_close_guard(bool (*may_close)(appdata *ad));
+// What a page that holds unsaved work says: whether the window may be closed now (if not, it has asked the
+// person), and which page must stay when pages are popped (null: none).
+struct tavro_page_guard {
+  bool (*may_close)(appdata *ad);
+  Elm_Object_Item *(*kept_page)(appdata *ad);
+};
+void tavro_set_page_guard(const tavro_page_guard &guard);
 
 // One button of a popup. `clicked` may be null: the popup then only closes.
 struct tavro_popup_button {
@@ -42,5 +47,5 @@ void tavro_delete_all_popup(appdata *ad);
 // Make a folder and its parents, readable by the owner alone. 0, or -1 with a log line.
 int tavro_create_dir(const char *path);
 
-// Pop every page above the landing page.
+// Pop every page above the landing page, or above the page that the guard keeps.
 void tavro_pop_naviframe_middle_items(appdata *ad);

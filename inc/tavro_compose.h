@@ -8,7 +8,7 @@
 
 struct appdata;
 
-// The open compose record, null when neither screen is open.
+// The open compose record, null when neither screen is open; there is one at most.
 compose_view_win *tavro_compose_view(appdata *ad);
 
 // What keeps a report from being sent, first things first.

@@ -18,6 +18,10 @@ void tavro_create_account_page(appdata *ad);
 // Read the phone's accounts anew; nothing when the page is not open.
 void tavro_refresh_account_page_items(appdata *ad);
 
+// Make room for another compose page: true when none is open, or the open one held nothing to lose and is
+// gone. Otherwise it is brought before the person with the question what to do with it.
+bool tavro_leave_compose_page(appdata *ad);
+
 // Compose screens. A non-null draft fills the screen and sets id_to_delete.
 void tavro_create_problem_page(appdata *ad, const svc_voc_data *draft);
 void tavro_create_idea_page(appdata *ad, const svc_voc_data *draft);

@@ -18,11 +18,11 @@ namespace {
 constexpr int kWindowWidthUnits = 360;
 constexpr int kWindowHeightUnits = 640;
 
-bool (*_close_guard)(appdata *) = nullptr;
+tavro_page_guard _guard{};
 
 void _close_requested_cb(void *data, Evas_Object *, void *) {
   appdata *ad = static_cast<appdata *>(data);
-  if (!_close_guard || _close_guard(ad)) ui_app_exit();
+  if (!_guard.may_close || _guard.may_close(ad)) ui_app_exit();
 }
 
 void _win_deleted_cb(void *data, Evas *, Evas_Object *, void *) {
@@ -50,8 +50,8 @@ void _back_key_cb(void *data, Evas_Object *, void *) {
 
 }  // namespace
 
-void tavro_set_close_guard(bool (*may_close)(appdata *ad)) {
-  _close_guard = may_close;
+void tavro_set_page_guard(const tavro_page_guard &guard) {
+  _guard = guard;
 }
 
 bool tavro_create_base_window(appdata *ad) {
@@ -94,5 +94,7 @@ int tavro_create_dir(const char *path) {
 }
 
 void tavro_pop_naviframe_middle_items(appdata *ad) {
-  if (ad->nf && ad->landing_nf_it) elm_naviframe_item_pop_to(ad->landing_nf_it);
+  if (!ad->nf || !ad->landing_nf_it) return;
+  Elm_Object_Item *kept = _guard.kept_page ? _guard.kept_page(ad) : nullptr;
+  elm_naviframe_item_pop_to(kept ? kept : ad->landing_nf_it);
 }

@@ -31,6 +31,7 @@ struct account_page {
   Evas_Object *name_field;
   Evas_Object *name_entry;  // null until "Another account" is touched
   GSList *accounts;
+  Ecore_Job *rebuild;                // null unless the list is about to be shown anew
   const tavro_account_info *chosen;  // null: the name that is typed
 };
 
@@ -40,10 +41,17 @@ const char *_shown_name(const tavro_account_info *account) {
 
 void _show_rows(account_page *view);
 
+// The clicked row goes with the rebuilt list, but not from inside its own callback.
+void _rebuild_job(void *data) {
+  account_page *view = static_cast<account_page *>(data);
+  view->rebuild = nullptr;
+  _show_rows(view);
+}
+
 void _row_clicked_cb(void *data, Evas_Object *row, void *) {
   account_page *view = static_cast<account_page *>(data);
   view->chosen = static_cast<const tavro_account_info *>(evas_object_data_get(row, "account"));
-  ecore_job_add([](void *job_data) { _show_rows(static_cast<account_page *>(job_data)); }, view);
+  if (!view->rebuild) view->rebuild = ecore_job_add(_rebuild_job, view);
 }
 
 void _build_account_row(account_page *view, const tavro_account_info *account) {
@@ -130,6 +138,7 @@ void _continue_clicked_cb(void *data, Evas_Object *, void *) {
 
 void _page_deleted_cb(void *data, Evas *, Evas_Object *, void *) {
   account_page *view = static_cast<account_page *>(data);
+  if (view->rebuild) ecore_job_del(view->rebuild);
   tavro_free_account_list(view->accounts);
   _open_page = nullptr;
   view->ad->account_layout = nullptr;

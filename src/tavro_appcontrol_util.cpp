@@ -5,7 +5,6 @@
 
 #include "tavro-main.h"
 #include "tavro_appdata.h"
-#include "tavro_handles.h"
 #include "tavro_log.h"
 #include "tavro_memory.h"
 #include "tavro_not_yet.h"
@@ -28,7 +27,6 @@ struct operation_row {
   const char *operation;  // null matches any
   const char *log_line;   // null: none
   step steps[kMostSteps];
-  bool is_for_person = false;  // wants a window: a client that is ending hands it to the next one
 };
 
 void _null_window(app_control_h, appdata *ad) {
@@ -108,11 +106,11 @@ constexpr operation_row kRows[] = {
      {tavro_handle_non_voc_push_noti, _null_window}},
     {"TAVRO_BETA_PUSH_NTFCTN", "TAVRO_BETA_PUSH_NTFCTN", {tavro_handle_beta_push_noti, _null_window}},
     {"TAVRO_USER_LOGOUT", "TAVRO_USER_LOGOUT", {tavro_handle_user_logout, _null_window}},
-    {"CRASH_PROCESS", nullptr, {tavro_handle_crash_event}, true},
+    {"CRASH_PROCESS", nullptr, {tavro_handle_crash_event}},
     {"DUMP_LOG_PROCESS", "dump log", {_exit_without_window, tavro_handle_log_dump_event}},
-    {APP_CONTROL_OPERATION_SHARE, nullptr, {tavro_handle_share_event}, true},
+    {APP_CONTROL_OPERATION_SHARE, nullptr, {tavro_handle_share_event}},
     {"TAVRO_UPDATE_HISTORY", nullptr, {tavro_handle_service_updates, _null_window}},
-    {nullptr, nullptr, {_start_or_click}, true},
+    {nullptr, nullptr, {_start_or_click}},
 };
 
 TavroText _read_operation(app_control_h request) {
@@ -143,17 +141,6 @@ void _ask_service_for_news() {
   }
 }
 
-// A person's request that arrives while the client ends (started for a message alone, say) would open no
-// window any more. The name is free by now, or will be in a moment, so the request sent anew starts the next
-// client.
-void _hand_on(app_control_h request) {
-  TavroAppControl copy;
-  if (app_control_clone(tavro_out(copy), request) != APP_CONTROL_ERROR_NONE) return;
-  app_control_set_app_id(copy.get(), TAVRO_APP_ID);
-  const int ret = app_control_send_launch_request(copy.get(), nullptr, nullptr);
-  TAVRO_LOGD("handed on to the next client: %d", ret);
-}
-
 // What came up before there was a window to show it in.
 void _show_due_popups(appdata *ad) {
   if (tavro_is_ending()) return;
@@ -174,7 +161,6 @@ void app_control(app_control_h request, void *user_data) {
   const TavroText operation = _read_operation(request);
   const operation_row &row = _find_row(operation.get());
   if (row.log_line) TAVRO_LOGD("%s", row.log_line);
-  if (row.is_for_person && tavro_is_ending()) return _hand_on(request);
   for (const step run : row.steps) {
     if (run) run(request, ad);
   }

@@ -67,6 +67,8 @@ void _target_chosen(appdata *ad, const char *name, const char *icon) {
 // ---- Ending the screen ----
 
 void _forget_view(appdata *ad) {
+  compose_view_win *view = tavro_compose_view(ad);
+  if (view && view->menu_popup) evas_object_del(view->menu_popup);
   if (ad->problem_view) {
     tavro_free_problem_view(ad->problem_view);
     TAVRO_FREE(ad->problem_view);
@@ -129,6 +131,18 @@ bool _may_close(appdata *ad) {
   return false;
 }
 
+Elm_Object_Item *_kept_page(appdata *ad) {
+  const compose_view_win *view = tavro_compose_view(ad);
+  return view ? view->nf_it : nullptr;
+}
+
+void _discard_from_menu(appdata *ad) {
+  if (_would_lose_something(tavro_compose_view(ad)))
+    _ask_before_leaving(ad);
+  else
+    _discard(ad);
+}
+
 void _page_deleted_cb(void *data, Evas *, Evas_Object *page, void *) {
   appdata *ad = static_cast<appdata *>(data);
   const compose_view_win *view = tavro_compose_view(ad);
@@ -162,7 +176,7 @@ void _menu_clicked_cb(void *data, Evas_Object *, void *) {
   if (!view) return;
   tavro_menu_show(ad, &view->menu_popup,
                   {{tavro_text("IDS_OB_BUTTON_SAVE_DRAFT"), _save_draft},
-                   {tavro_text("IDS_OB_BUTTON_DISCARD"), _discard}});
+                   {tavro_text("IDS_OB_BUTTON_DISCARD"), _discard_from_menu}});
 }
 
 void _target_clicked_cb(void *data, Evas_Object *, void *) {
@@ -211,8 +225,12 @@ void _build_target(appdata *ad, compose_view_win *view, Evas_Object *box) {
 void _fill_from_draft(compose_view_win *view, const svc_voc_data *draft) {
   elm_entry_entry_set(view->entry, tavro_markup(draft->description).c_str());
   elm_entry_entry_set(view->title_entry, tavro_markup(draft->title_description).c_str());
-  for (const GSList *link = draft->attachments; link; link = link->next)
-    tavro_compose_attach(view, static_cast<const tavro_dbmgr_attachment_info *>(link->data)->file_path);
+  for (const GSList *link = draft->attachments; link; link = link->next) {
+    const char *path = static_cast<const tavro_dbmgr_attachment_info *>(link->data)->file_path;
+    // One that cannot be read just now stays attached: support is told its name if it is gone for good.
+    if (!tavro_compose_attach(view, path))
+      view->attachments = g_slist_append(view->attachments, TAVRO_STRDUP(path));
+  }
 }
 
 Evas_Object *_build_content(appdata *ad, compose_view_win *view, const char *hint) {
@@ -256,26 +274,50 @@ void _build_page(appdata *ad, compose_view_win *view, const svc_voc_data *draft,
   tavro_compose_strip_refresh(ad);
   view->nf_it = tavro_page_push(ad, view->layout, title);
   elm_naviframe_item_pop_cb_set(view->nf_it, _pop_cb, ad);
-  tavro_set_close_guard(_may_close);
+  tavro_set_page_guard({_may_close, _kept_page});
   tavro_autosave_start(ad);
+}
+
+// The dump and the system log that a draft of a problem holds.
+void _take_files(problem_view_win *view, const svc_voc_data *draft) {
+  if (draft->dump_file) {
+    view->dump_filepath = TAVRO_STRDUP(draft->dump_file);
+    view->dump_filename = TAVRO_STRDUP(draft->dump_name);
+  }
+  if (draft->syslog_file && *draft->syslog_file) {
+    const char *slash = std::strrchr(draft->syslog_file, '/');
+    view->syslog_filepath = TAVRO_STRDUP(draft->syslog_file);
+    view->syslog_filename = TAVRO_STRDUP(slash ? slash + 1 : draft->syslog_file);
+  }
 }
 
 }  // namespace
 
+bool tavro_leave_compose_page(appdata *ad) {
+  compose_view_win *view = tavro_compose_view(ad);
+  if (!view) return true;
+  if (_would_lose_something(view)) {
+    elm_naviframe_item_pop_to(view->nf_it);
+    _ask_before_leaving(ad);
+    return false;
+  }
+  Elm_Object_Item *page = view->nf_it;
+  _end_without_record(ad, false);
+  elm_object_item_del(page);
+  return true;
+}
+
 void tavro_create_problem_page(appdata *ad, const svc_voc_data *draft) {
-  _forget_view(ad);
+  if (!tavro_leave_compose_page(ad)) return;
   ad->type = ad->type == CRASH ? CRASH : PROBLEM;
   ad->problem_view = TAVRO_ZALLOC(problem_view_win);
-  if (draft && draft->dump_file) {
-    ad->problem_view->dump_filepath = TAVRO_STRDUP(draft->dump_file);
-    ad->problem_view->dump_filename = TAVRO_STRDUP(draft->dump_name);
-  }
+  if (draft) _take_files(ad->problem_view, draft);
   _build_page(ad, ad->problem_view, draft, tavro_text("IDS_OB_HEADER_REPORT_A_PROBLEM"),
               tavro_text("IDS_OB_BODY_PROBLEM_HINT"));
 }
 
 void tavro_create_idea_page(appdata *ad, const svc_voc_data *draft) {
-  _forget_view(ad);
+  if (!tavro_leave_compose_page(ad)) return;
   ad->type = IDEA;
   ad->idea_view = TAVRO_ZALLOC(idea_view_win);
   _build_page(ad, ad->idea_view, draft, tavro_text("IDS_OB_HEADER_SHARE_AN_IDEA"),

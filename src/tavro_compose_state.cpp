@@ -11,7 +11,7 @@
 #include "tavro_memory.h"
 
 compose_view_win *tavro_compose_view(appdata *ad) {
-  if (ad->type == IDEA) return ad->idea_view;
+  if (ad->idea_view) return ad->idea_view;
   return ad->problem_view;
 }
 

@@ -34,12 +34,16 @@ void _attach_clicked_cb(void *data, Evas_Object *, void *) {
   tavro_create_gallery_picker(static_cast<appdata *>(data), _pictures_chosen);
 }
 
+void _path_deleted_cb(void *data, Evas *, Evas_Object *, void *) {
+  char *path = static_cast<char *>(data);
+  TAVRO_FREE(path);
+}
+
 void _remove_clicked_cb(void *data, Evas_Object *button, void *) {
   appdata *ad = static_cast<appdata *>(data);
   compose_view_win *view = tavro_compose_view(ad);
-  const TavroText path(TAVRO_STRDUP(static_cast<const char *>(evas_object_data_get(button, "path"))));
-  if (!view || !path) return;
-  tavro_compose_detach(view, path.get());
+  if (!view) return;
+  tavro_compose_detach(view, static_cast<const char *>(evas_object_data_get(button, "path")));
   // The clicked button goes with the rebuilt strip, but not from inside its own callback.
   ecore_job_add([](void *job_data) { tavro_compose_strip_refresh(static_cast<appdata *>(job_data)); }, ad);
 }
@@ -59,7 +63,9 @@ Evas_Object *_build_thumb(appdata *ad, compose_view_win *view, const char *path)
   const std::string remove_name = std::string(tavro_text("IDS_OB_BUTTON_REMOVE")) + " " + name;
   Evas_Object *remove = tavro_button_add(frame, "tavro_remove", nullptr, tavro_icon_add(frame, "close/small"),
                                          remove_name.c_str(), _remove_clicked_cb, ad);
-  evas_object_data_set(remove, "path", path);
+  char *own_path = TAVRO_STRDUP(path);
+  evas_object_data_set(remove, "path", own_path);
+  evas_object_event_callback_add(remove, EVAS_CALLBACK_FREE, _path_deleted_cb, own_path);
   elm_object_part_content_set(frame, "tavro.swallow.remove", remove);
   return frame;
 }

@@ -84,10 +84,10 @@ void _open_report(appdata *ad, genlist_item *row) {
 
 void _reopen_draft(appdata *ad, const svc_voc_data *voc) {
   TAVRO_LOGD("type:%s", voc->type);
-  if (!_is_idea(voc) && voc->dump_file) {
-    ad->hType = ERROR;
-    ad->type = CRASH;
-  }
+  if (!tavro_leave_compose_page(ad)) return;
+  const bool is_crash = !_is_idea(voc) && voc->dump_file;
+  if (is_crash) ad->hType = ERROR;
+  ad->type = is_crash ? CRASH : PROBLEM;
   tavro_edit_cb(ad, voc);
 }
 
@@ -155,6 +155,11 @@ void _show_reports(appdata *ad, const char *user_name) {
   int count = 0;
   history->history_genlist_items = nullptr;
   get_voc_list_from_db(&count, &history->history_genlist_items, user_name);
+  if (!history->history_genlist_items && shown && tavro_dbmgr_get_voc_count(user_name) != 0) {
+    // The store could not be read just now: what is shown is better than nothing.
+    history->history_genlist_items = shown;
+    return;
+  }
   if (!history->history_genlist_items) {
     history->history_genlist = nullptr;
     elm_object_content_set(history->page, _build_empty(history->page));

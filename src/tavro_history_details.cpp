@@ -51,9 +51,6 @@ void _resend_clicked_cb(void *data, Evas_Object *button, void *event_info) {
   evas_object_data_set(button, "app_data", ad);
   tavro_resend_register_screen({_show_no_file_accessible, _close});
   tavro_send_cb(_details.voc, button, event_info);
-  // A list that is still open shows the report as being sent.
-  ecore_job_add([](void *job_data) { tavro_update_history_page(nullptr, static_cast<appdata *>(job_data)); },
-                ad);
 }
 
 // ---- Building ----

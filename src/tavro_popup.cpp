@@ -10,6 +10,9 @@
 
 namespace {
 
+// While any is shown, nothing below can take the focus.
+int _shown_overlays = 0;
+
 struct popup_state {
   appdata *ad;
   Evas_Object **slot;
@@ -24,8 +27,9 @@ struct button_state {
 void _popup_deleted_cb(void *data, Evas *, Evas_Object *popup, void *) {
   popup_state *state = static_cast<popup_state *>(data);
   if (*state->slot == popup) *state->slot = nullptr;
+  --_shown_overlays;
   // The window may be going down with its popup.
-  if (state->ad->nf) elm_object_tree_focus_allow_set(state->ad->nf, EINA_TRUE);
+  if (state->ad->nf && _shown_overlays == 0) elm_object_tree_focus_allow_set(state->ad->nf, EINA_TRUE);
   TAVRO_FREE(state);
 }
 
@@ -49,6 +53,7 @@ Evas_Object *_overlay_add(appdata *ad, Evas_Object **slot, const char *group) {
   if (*slot) evas_object_del(*slot);
   Evas_Object *popup = tavro_layout_add(ad->win, group);
   elm_win_resize_object_add(ad->win, popup);
+  ++_shown_overlays;
   popup_state *state = TAVRO_ZALLOC(popup_state);
   state->ad = ad;
   state->slot = slot;

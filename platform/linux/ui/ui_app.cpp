@@ -65,10 +65,23 @@ void windows_changed(bool is_seen) {
 // The user asked for the application. Operations of other names are messages between applications.
 bool asks_for_window(const app_control_s &request) {
   static const std::string kUserOperations = "http://tizen.org/appcontrol/operation/";
-  return request.operation && request.operation->compare(0, kUserOperations.size(), kUserOperations) == 0;
+  return !request.operation || request.operation->compare(0, kUserOperations.size(), kUserOperations) == 0;
+}
+
+// The user's request met an application on its way out, which opens no window any more. The name is free by
+// now, or will be in a moment: sent anew, the request starts the application again.
+void hand_on(app_control_h request) {
+  app_control_h again = nullptr;
+  if (app_control_clone(&again, request) != APP_CONTROL_ERROR_NONE) return;
+  app_control_set_app_id(again, platform::application_id().c_str());
+  const int error = app_control_send_launch_request(again, nullptr, nullptr);
+  if (error != APP_CONTROL_ERROR_NONE)
+    dlog_print(DLOG_ERROR, "PLATFORM", "a request that met the end was not handed on: %d", error);
+  app_control_destroy(again);
 }
 
 void launch(app_control_h request) {
+  if (app.is_ending && asks_for_window(*request)) return hand_on(request);
   app.callback.app_control(request, app.user_data);
   platform::report_first_frame();
   if (app.phase == Phase::kCreated) {
