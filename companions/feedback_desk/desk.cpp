@@ -76,13 +76,22 @@ std::string _authorization(const Call &call, const char *scheme) {
   return header + length + 1;
 }
 
+// Only wrong secrets count, and the right one always gets in: nobody can lock others out by guessing. A
+// secret has 256 random bits, so what the limit does not stop is hopeless.
+bool _has_secret(const Call &call, const char *scheme, const std::string &secret, int status,
+                 const char *reason) {
+  if (same_secret(_authorization(call, scheme), secret)) return true;
+  const bool may_be_wrong = call.desk.wrong_secret_rate.take(call.peer());
+  refuse(call, may_be_wrong ? status : 429,
+         may_be_wrong ? reason : "too many wrong secrets, try again later");
+  return false;
+}
+
 bool _is_enrolled(Call &call) {
-  if (!call.desk.enrolment_rate.take("")) {
-    refuse(call, 429, "too many registrations, try again later");
+  if (!_has_secret(call, "Enrolment", call.desk.enrolment_secret, 403, "the enrolment secret is wrong"))
     return false;
-  }
-  if (same_secret(_authorization(call, "Enrolment"), call.desk.enrolment_secret)) return true;
-  refuse(call, 403, "the enrolment secret is wrong");
+  if (call.desk.enrolment_rate.take("")) return true;
+  refuse(call, 429, "too many registrations, try again later");
   return false;
 }
 
@@ -100,15 +109,7 @@ bool _is_device(Call &call) {
 }
 
 bool _is_staff(Call &call) {
-  auto &rate = call.desk.wrong_login_rate;
-  if (!rate.has_room("api")) {
-    refuse(call, 429, "too many wrong tokens, try again later");
-    return false;
-  }
-  if (same_secret(_authorization(call, "Bearer"), call.desk.staff_token)) return true;
-  rate.take("api");
-  refuse(call, 401, "the staff token is wrong");
-  return false;
+  return _has_secret(call, "Bearer", call.desk.staff_token, 401, "the staff token is wrong");
 }
 
 std::string _session_cookie(const Call &call) {

@@ -24,9 +24,9 @@ struct Desk {
   DeskFiles files;
   StaffSessions sessions;
   UpdateWaiters waiters;
-  RateLimit device_rate{20.0, 400.0};                     // calls per second, burst; per device
-  RateLimit enrolment_rate{5.0, 50.0};                    // registrations, together
-  RateLimit wrong_login_rate{0.2, 10.0};                  // wrong staff tokens, together
+  RateLimit device_rate{20.0, 400.0};      // calls per second, burst; per device
+  RateLimit enrolment_rate{5.0, 50.0};     // registrations with the right secret, together
+  RateLimit wrong_secret_rate{0.2, 10.0};  // wrong staff tokens and enrolment secrets; per peer
   std::map<std::string, std::shared_ptr<bool>> arriving;  // files being received; false when taken over
   std::string staff_token;
   std::string enrolment_secret;
@@ -57,6 +57,11 @@ struct Call {
 
   const char *header(const char *name) const {
     return soup_message_headers_get_one(soup_server_message_get_request_headers(message), name);
+  }
+  // The address that the call came from.
+  std::string peer() const {
+    const char *host = soup_server_message_get_remote_host(message);
+    return host ? host : "";
   }
   void set_header(const char *name, const char *value) const {
     soup_message_headers_replace(soup_server_message_get_response_headers(message), name, value);

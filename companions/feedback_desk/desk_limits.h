@@ -22,12 +22,6 @@ class RateLimit {
     bucket.level -= 1.0;
     return true;
   }
-  // Whether take() would succeed, without taking.
-  bool has_room(const std::string &caller) {
-    if (!take(caller)) return false;
-    buckets_.at(caller).level += 1.0;
-    return true;
-  }
 
  private:
   struct Bucket {

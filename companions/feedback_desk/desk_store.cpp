@@ -106,8 +106,11 @@ std::optional<int64_t> DeskStore::add_report(const std::string &key, const DeskR
       key, report.device, report.kind, report.title, report.text, report.app, report.severity, report.user,
       report.created_ms, DESK_STATUS_SUBMITTED, report.model_json);
   if (!stored) return std::nullopt;
-  return database_.number("SELECT id FROM report WHERE idempotency_key = ? AND device = ?", key,
-                          report.device);
+  return report_of_key(key, report.device);
+}
+
+std::optional<int64_t> DeskStore::report_of_key(const std::string &key, const std::string &device) {
+  return database_.number("SELECT id FROM report WHERE idempotency_key = ? AND device = ?", key, device);
 }
 
 std::optional<DeskReport> DeskStore::report(int64_t id) {

@@ -68,6 +68,8 @@ class DeskStore {
   // The id of the report with this key; a report that is known stays as it was first sent. Null when the
   // key belongs to another device or the store cannot be written.
   std::optional<int64_t> add_report(const std::string &key, const DeskReport &report);
+  // Null when the device has no report with this key.
+  std::optional<int64_t> report_of_key(const std::string &key, const std::string &device);
   std::optional<DeskReport> report(int64_t id);
   int64_t report_count(const std::string &device);
   bool complete_report(int64_t id, const std::string &missing_json);

@@ -124,10 +124,12 @@ void handle_add_report(Call &call) {
   if (body.is_discarded()) return;
   const DeskReport sent = _report_of(call, body);
   if (const char *fault = _report_fault(sent)) return refuse(call, 422, fault);
-  if (call.desk.store.report_count(call.device) >= kMostReportsPerDevice)
+  DeskStore &store = call.desk.store;
+  auto id = store.report_of_key(key, call.device);
+  if (!id && store.report_count(call.device) >= kMostReportsPerDevice)
     return refuse(call, 403, "this device has sent its 10000 reports");
-  const auto id = call.desk.store.add_report(key, sent);
-  const auto stored = id ? call.desk.store.report(*id) : std::nullopt;
+  if (!id) id = store.add_report(key, sent);
+  const auto stored = id ? store.report(*id) : std::nullopt;
   if (!stored) return refuse(call, 503, "the desk cannot store the report");
   answer_json(call, 201, {{"id", *id}, {"complete", stored->is_complete}, {"status", stored->status}});
 }

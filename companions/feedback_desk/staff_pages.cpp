@@ -214,13 +214,11 @@ void handle_login_page(Call &call) {
 }
 
 void handle_login(Call &call) {
-  auto &rate = call.desk.wrong_login_rate;
-  if (!rate.has_room("page"))
-    return _answer_login(call, 429, "Too many wrong tokens. Try again in a minute.");
   const auto form = body_form(call);
   const auto token = form.find("token");
   if (token == form.end() || !same_secret(token->second, call.desk.staff_token)) {
-    rate.take("page");
+    if (!call.desk.wrong_secret_rate.take(call.peer()))
+      return _answer_login(call, 429, "Too many wrong tokens. Try again in a minute.");
     return _answer_login(call, 403, "This is not the staff token.");
   }
   call.set_header("Set-Cookie", (kSessionCookie + call.desk.sessions.begin() + kCookieScope).c_str());

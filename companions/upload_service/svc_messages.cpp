@@ -4,6 +4,7 @@
 
 #include <memory>
 #include <type_traits>
+#include <utility>
 
 #include "svc_log.h"
 #include "svc_report.h"
@@ -13,7 +14,6 @@ namespace {
 
 constexpr char kClient[] = "corvane.tavro-lite";
 constexpr char kOperation[] = "TAVRO_UPDATE_HISTORY";
-constexpr int kMostAttempts = 5;
 
 struct RequestDeleter {
   void operator()(app_control_h request) const { app_control_destroy(request); }
@@ -21,14 +21,17 @@ struct RequestDeleter {
 using Request = std::unique_ptr<std::remove_pointer_t<app_control_h>, RequestDeleter>;
 
 // A success that the store does not show was interrupted before it was stored: the report is sent again and
-// then told again.
+// then told again. A failure that was overcome before the client could be told of it is none.
 bool _is_still_true(const SvcMessage &message) {
   const SvcVoc voc(tavro_dbmgr_get_voc_by_id(message.voc_id));
   if (!voc) return false;
-  if (message.kind != SVC_MESSAGE_SENT) return true;
+  if (message.kind == SVC_MESSAGE_ANSWERED) return true;
   const int status = svc_last_status(*voc);
-  return status != TAVRO_STATUS_SENDING && status != TAVRO_STATUS_SENDING_FAILED_NO_NETWORK &&
-         status != TAVRO_STATUS_DRAFT_SAVED;
+  const bool is_waiting = status == TAVRO_STATUS_SENDING ||
+                          status == TAVRO_STATUS_SENDING_FAILED_NO_NETWORK ||
+                          status == TAVRO_STATUS_DRAFT_SAVED;
+  if (message.kind == SVC_MESSAGE_SENT) return !is_waiting;
+  return is_waiting || status == TAVRO_STATUS_SENDING_FAILED;
 }
 
 // The keys and texts are the client's: it matches them.
@@ -63,24 +66,24 @@ void SvcMessages::deliver() {
   const Request request = _request_of(*message);
   if (!request) return retry_.later();
   auto handled = +[](app_control_h, app_control_h reply, app_control_result_e result, void *data) {
-    static_cast<SvcMessages *>(data)->on_delivered(reply || result == APP_CONTROL_RESULT_SUCCEEDED);
+    static_cast<SvcMessages *>(data)->on_delivered(reply, result == APP_CONTROL_RESULT_SUCCEEDED);
   };
   is_sending_ = true;
   const int error = app_control_send_launch_request(request.get(), handled, this);
-  if (error == APP_CONTROL_ERROR_NONE) return;
-  SVC_LOGE("the client cannot be told of report %d: %d", message->voc_id, error);
-  on_delivered(false);
+  if (error != APP_CONTROL_ERROR_NONE) on_delivered(false, false);
 }
 
-void SvcMessages::on_delivered(bool was_handled) {
+void SvcMessages::on_delivered(bool has_answered, bool is_accepted) {
   is_sending_ = false;
   const auto message = state_.first_message();
   if (!message) return;
-  const bool is_given_up = !was_handled && ++attempts_ >= kMostAttempts;
-  if (is_given_up)
-    SVC_LOGE("the client did not take %d times what became of report %d", attempts_, message->voc_id);
-  if (!was_handled && !is_given_up) return retry_.later();
-  attempts_ = 0;
+  if (!has_answered && !is_accepted) {
+    if (!std::exchange(is_unreachable_, true))
+      SVC_LOGE("the client cannot be told of report %d yet", message->voc_id);
+    return retry_.later();
+  }
+  is_unreachable_ = false;
+  if (!is_accepted) SVC_LOGE("the client refused to hear what became of report %d", message->voc_id);
   retry_.reset();
   if (state_.remove_message(message->id))
     deliver();

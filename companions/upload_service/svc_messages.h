@@ -1,5 +1,6 @@
 // Messages to the client: launch requests about the fate of reports, in order, each until the client has
-// handled it. They lie in the service's state, so none is lost when either program dies. Main loop only.
+// answered it: one that cannot be reached is tried again, at the slowest every 30 seconds. They lie in the
+// service's state, so none is lost when either program dies. Main loop only.
 #pragma once
 
 #include "svc_retry.h"
@@ -13,10 +14,10 @@ class SvcMessages {
   void deliver();
 
  private:
-  void on_delivered(bool was_handled);
+  void on_delivered(bool has_answered, bool is_accepted);
 
   SvcState &state_;
   Retry retry_;
   bool is_sending_ = false;
-  int attempts_ = 0;  // for the first message
+  bool is_unreachable_ = false;  // the client, at the last attempt; logged once
 };

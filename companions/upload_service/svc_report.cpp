@@ -45,22 +45,27 @@ std::string _key_of(const svc_voc_data &voc, const std::string &phone) {
   return phone + ":" + std::to_string(voc.id) + ":" + _text(voc.date_of_creation);
 }
 
-// Every place of the report counts, also one whose file is gone, so that numbers never shift.
+// Every place of the report counts, also one whose file is gone, so that numbers never shift. What support
+// needs most comes first: when there are more files than the desk takes, the last attachments stay behind.
 std::vector<SvcFile> _files_of(const svc_voc_data &voc) {
   std::vector<SvcFile> files;
   auto add = [&files](const char *path, const char *kind) {
     if (path && *path) files.push_back({static_cast<int>(files.size()) + 1, path, kind});
   };
-  for (GSList *item = voc.attachments; item; item = item->next)
-    add(static_cast<tavro_dbmgr_attachment_info *>(item->data)->file_path, "attachment");
   const TavroText device_status(tavro_dbmgr_get_device_data_file_by_id(voc.id));
   add(device_status.get(), "device_status");
   add(voc.syslog_file, "system_log");
   add(voc.dump_file, "crash_dump");
+  for (GSList *item = voc.attachments; item; item = item->next)
+    add(static_cast<tavro_dbmgr_attachment_info *>(item->data)->file_path, "attachment");
   return files;
 }
 
 }  // namespace
+
+bool svc_is_complete(int voc_id) {
+  return TavroText(tavro_dbmgr_get_voc_title_description_by_id(voc_id)) != nullptr;
+}
 
 std::optional<SvcReport> svc_read_report(int voc_id, const std::string &phone) {
   const SvcVoc voc(tavro_dbmgr_get_voc_by_id(voc_id));

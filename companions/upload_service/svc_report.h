@@ -27,6 +27,9 @@ struct SvcReport {
   std::vector<SvcFile> files;
 };
 
+// Whether the client has written all of a report: its extension row, which carries a title text, comes last.
+bool svc_is_complete(int voc_id);
+
 // Null when the record is not in the store.
 std::optional<SvcReport> svc_read_report(int voc_id, const std::string &phone);
 

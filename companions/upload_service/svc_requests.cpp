@@ -19,14 +19,22 @@ std::string _extra_data(app_control_h request, const char *key) {
   return text;
 }
 
-void _send_report(app_control_h request, const char *operation, SvcUploader &uploader) {
+void _take_report(app_control_h request, const char *operation, SvcRequestKind kind, SvcUploader &uploader) {
   const std::string text = _extra_data(request, kVocIdKey);
   const int voc_id = svc_parse_voc_id(text.c_str());
   if (voc_id == 0) {
     SVC_LOGE("%s without a record id: \"%.*s\"", operation, kShownBytes, text.c_str());
     return;
   }
-  uploader.request(voc_id);
+  uploader.request(voc_id, kind);
+}
+
+void _send_report(app_control_h request, const char *operation, SvcUploader &uploader) {
+  _take_report(request, operation, SvcRequestKind::kFirst, uploader);
+}
+
+void _send_again(app_control_h request, const char *operation, SvcUploader &uploader) {
+  _take_report(request, operation, SvcRequestKind::kAgain, uploader);
 }
 
 void _say_no_catalogue(app_control_h, const char *operation, SvcUploader &) {
@@ -40,7 +48,7 @@ struct Operation {
 
 const Operation kOperations[] = {
     {"TAVRO_OPERATION_TYPE_UI", _send_report},
-    {"TAVRO_SEND_FAILED_VOC", _send_report},
+    {"TAVRO_SEND_FAILED_VOC", _send_again},
     {"TAVRO_OPERATION_TYPE_APP_UPDATE", _say_no_catalogue},
     {"TAVRO_OPERATION_TYPE_GET_BANNERS", _say_no_catalogue},
     {"TAVRO_OPERATION_TYPE_GET_BETA_DETAILS", _say_no_catalogue},

@@ -87,11 +87,11 @@ std::vector<int> SvcState::requested() {
   return ids;
 }
 
-bool SvcState::add_requested(int voc_id) {
-  // Asked for again: a failure of this new attempt is news.
+bool SvcState::add_requested(int voc_id, SvcRequestKind kind) {
   Transaction transaction(database_);
   return database_.run("INSERT OR IGNORE INTO requested(voc) VALUES(?)", voc_id) &&
-         database_.run("DELETE FROM announced WHERE voc = ?", voc_id) && transaction.commit();
+         (kind != SvcRequestKind::kAgain || database_.run("DELETE FROM announced WHERE voc = ?", voc_id)) &&
+         transaction.commit();
 }
 
 bool SvcState::remove_requested(int voc_id) {

@@ -18,6 +18,12 @@ enum SvcMessageKind {
   SVC_MESSAGE_ANSWERED = 3,  // support staff set a status or replied
 };
 
+// Why a launch request names a report.
+enum class SvcRequestKind {
+  kFirst,  // it was just stored, or found waiting; the service may have tried it already on its own
+  kAgain,  // the person saw it fail and asked again: another failure is news
+};
+
 struct SvcMessage {
   int64_t id = 0;
   SvcMessageKind kind = SVC_MESSAGE_SENT;
@@ -52,7 +58,7 @@ class SvcState {
   // Reports that a launch request named and that are not sent yet. Drafts are known only here: the store
   // shows them as drafts until they have arrived.
   std::vector<int> requested();
-  bool add_requested(int voc_id);
+  bool add_requested(int voc_id, SvcRequestKind kind);
   bool remove_requested(int voc_id);
 
   // Reports whose failure the client was told of in this outage.

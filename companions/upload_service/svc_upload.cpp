@@ -124,6 +124,7 @@ void SvcUpload::ask_state() {
 }
 
 void SvcUpload::send_piece(int64_t offset) {
+  current_.offset = offset;
   const auto size = static_cast<size_t>(std::min(kPieceBytes, current_.size - offset));
   DeskCall call = call_for_file("PUT");
   call.content_type = "application/octet-stream";
@@ -146,8 +147,9 @@ void SvcUpload::on_piece(const DeskReply &reply) {
     if (++current_.faults > kMostFaults) return skip_file("it changes while it is sent");
     return open_file();  // its content may be another one by now
   }
-  if (reply.is_ok() && !flag_field(reply.body, "complete") && received > 0 && received < current_.size)
-    return send_piece(received);
+  // Anything but progress ends this attempt, or a confused desk would get the same piece for ever.
+  const bool has_progress = received > current_.offset && received < current_.size;
+  if (reply.is_ok() && !flag_field(reply.body, "complete") && has_progress) return send_piece(received);
   const bool has_older_content = reply.status == 409;
   if (!has_older_content && !(reply.is_ok() && flag_field(reply.body, "complete")))
     return end(reply, "sending");

@@ -35,7 +35,8 @@ class SvcUpload : public std::enable_shared_from_this<SvcUpload> {
     std::shared_ptr<UniqueFd> fd;
     int64_t size = 0;  // bytes, as of the checksum; what is written behind later is not sent
     std::string sha256;
-    int faults = 0;  // times that the desk refused its content or position
+    int64_t offset = 0;  // where the piece under way starts
+    int faults = 0;      // times that the desk refused its content or position
   };
 
   void announce();

@@ -1,7 +1,5 @@
 #include "svc_uploader.h"
 
-#include <app_preference.h>
-
 #include <algorithm>
 #include <set>
 
@@ -18,22 +16,18 @@ bool _waits_to_be_sent(int status) {
 
 bool _is_store_ready() {
   static bool is_ready = false;
-  if (is_ready) return true;
-  const tavro_dbmgr_store_state state = tavro_dbmgr_ensure_schema();
-  // The client tells the person, at its next start.
-  if (state == TAVRO_STORE_REPLACED) preference_set_boolean("tavro_store_replaced", true);
-  is_ready = state != TAVRO_STORE_UNUSABLE;
+  if (!is_ready) is_ready = tavro_dbmgr_ensure_schema() != TAVRO_STORE_UNUSABLE;
   return is_ready;
 }
 
 }  // namespace
 
-void SvcUploader::request(int voc_id) {
+void SvcUploader::request(int voc_id, SvcRequestKind kind) {
   const SvcVoc voc(_is_store_ready() ? tavro_dbmgr_get_voc_by_id(voc_id) : nullptr);
   if (!voc) return SVC_LOGE("report %d is not in the store", voc_id), void();
   if (!_waits_to_be_sent(svc_last_status(*voc)))
     return SVC_LOGI("report %d is at the desk already", voc_id), void();
-  state_.add_requested(voc_id);
+  state_.add_requested(voc_id, kind);
   wake();
 }
 
@@ -48,7 +42,10 @@ void SvcUploader::wake() {
 
 std::vector<int> SvcUploader::work() const {
   const auto requested = state_.requested();
-  std::set<int> ids(requested.begin(), requested.end());
+  std::set<int> ids;
+  // A report that is still being written waits; one that is gone is found and forgotten when its turn comes.
+  for (int voc_id : requested)
+    if (svc_is_complete(voc_id) || !SvcVoc(tavro_dbmgr_get_voc_by_id(voc_id))) ids.insert(voc_id);
   GSList *stored = tavro_dbmgr_get_vocs_to_send();
   for (GSList *item = stored; item; item = item->next) ids.insert(GPOINTER_TO_INT(item->data));
   g_slist_free(stored);

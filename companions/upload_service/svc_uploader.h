@@ -17,7 +17,7 @@ class SvcUploader {
       : state_(state), desk_(desk), messages_(messages), retry_([this] { begin_pass(); }) {}
 
   // A launch request named this report.
-  void request(int voc_id);
+  void request(int voc_id, SvcRequestKind kind);
   // There may be work, or the desk is back.
   void wake();
   // The report arrived at the desk under this id; harmless when that is known already.

@@ -4,6 +4,7 @@ import http.client
 import json
 import os
 import re
+import sqlite3
 import subprocess
 import threading
 import time
@@ -126,6 +127,21 @@ def test_the_same_key_gives_the_same_report_also_after_registering_again(desk):
     desk.device = desk.register()
     assert desk.report("k1") == report
     assert desk.call("GET", "/api/v1/updates", None, old_token)[0] == 401
+
+
+def test_a_device_with_its_most_reports_can_still_finish_one_that_the_desk_knows(desk):
+    report = desk.report("known")
+    with sqlite3.connect(desk.folder + "/desk.db", timeout=10) as database:
+        columns = ", ".join(row[1] for row in database.execute("PRAGMA table_info(report)")
+                            if row[1] not in ("id", "idempotency_key"))
+        database.execute("WITH RECURSIVE n(i) AS (SELECT 2 UNION ALL SELECT i + 1 FROM n WHERE i < 10000) "
+                         f"INSERT INTO report(idempotency_key, {columns}) "
+                         f"SELECT 'more' || i, {columns} FROM report, n")
+    database.close()
+    assert desk.report("known") == report
+    status, answer, _ = desk.call("POST", "/api/v1/reports", {"kind": "idea"}, desk.token(),
+                                  Idempotency_Key="new")
+    assert status == 403 and "10000" in answer["error"]
 
 
 def test_a_device_cannot_reach_the_report_of_another(desk):
@@ -281,9 +297,15 @@ def test_staff_answer_on_the_page_and_a_foreign_form_is_refused(desk):
     assert desk.call("GET", "/staff", Cookie=cookie)[0] == 303
 
 
-def test_guessing_the_staff_token_is_slowed_down(desk):
-    statuses = [desk.call("POST", "/staff/login", "token=guess")[0] for _ in range(15)]
-    assert statuses[0] == 403 and statuses[-1] == 429
+@pytest.mark.parametrize("method, path, token, wrong", [
+    ("POST", "/staff/login", None, 403), ("GET", "/api/v1/staff/reports", "guess", 401),
+    ("POST", "/api/v1/devices", "Enrolment guess", 403)])
+def test_wrong_secrets_are_limited_but_lock_nobody_out(desk, method, path, token, wrong):
+    statuses = [desk.call(method, path, "token=guess", token)[0] for _ in range(60)]
+    assert statuses[0] == wrong and statuses[-1] == 429
+    desk.sign_in()
+    assert desk.call("GET", "/api/v1/staff/reports", None, desk.staff)[0] == 200
+    assert desk.report()
 
 
 def test_a_desk_that_is_asked_to_end_ends_cleanly_and_bad_options_are_explained(desk, tmp_path):

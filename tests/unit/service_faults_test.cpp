@@ -97,6 +97,20 @@ TEST_F(ServiceFaults, ADeskIdThatAnotherReportHasDoesNotMakeItSentForEver) {
   EXPECT_EQ(desk.reports, 2);
 }
 
+TEST_F(ServiceFaults, ADeskThatNeverTakesMoreOfAFileEndsTheAttempt) {
+  FakeDesk desk;
+  desk.on_report = [](SoupServerMessage *message) { respond(message, 201, R"({"id": 7})"); };
+  desk.on_file = [](SoupServerMessage *message) {
+    const bool is_question = strcmp(soup_server_message_get_method(message), "GET") == 0;
+    respond(message, is_question ? 404 : 202, R"({"received": 5, "complete": false})");
+  };
+  const int id = store_report();
+  start_service(desk.url);
+  ASSERT_TRUE(wait_until([&] { return desk.reports >= 3; }));
+  EXPECT_LE(desk.files, 9);  // each time one question, the first piece and the rest
+  EXPECT_EQ(column("VOC_STATE", id), "11");
+}
+
 TEST_F(ServiceFaults, AReportThatOneFaultHoldsBackDoesNotHoldBackTheOthers) {
   FakeDesk desk;
   desk.on_report = [&](SoupServerMessage *message) {

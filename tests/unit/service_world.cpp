@@ -76,6 +76,7 @@ FakeDesk::FakeDesk() : server_(soup_server_new(nullptr, nullptr)) {
       return answer_json(message, 201, R"({"device": "d", "token": ")" + self->token + "\"}");
     }
     if (strcmp(path, "/api/v1/reports") == 0) return ++self->reports, self->on_report(message);
+    if (strstr(path, "/attachments/") && self->on_file) return ++self->files, self->on_file(message);
     if (strstr(path, "/complete")) return answer_json(message, 200, R"({"id": 7, "status": 1})");
     soup_server_message_pause(message);  // no news
   };
@@ -98,9 +99,15 @@ void ServiceWorld::SetUp() {
   static const GDBusInterfaceVTable kTable = {launch_cb, nullptr, nullptr, {}};
   object_ = g_dbus_connection_register_object(bus_.get(), "/corvane/tavro_lite", node->interfaces[0], &kTable,
                                               this, nullptr, nullptr);
+  set_client_present(true);
+}
+
+void ServiceWorld::set_client_present(bool is_present) {
+  GVariant *name = is_present ? g_variant_new("(su)", "corvane.tavro-lite", 4)
+                              : g_variant_new("(s)", "corvane.tavro-lite");
   g_variant_unref(g_dbus_connection_call_sync(bus_.get(), "org.freedesktop.DBus", "/", "org.freedesktop.DBus",
-                                              "RequestName", g_variant_new("(su)", "corvane.tavro-lite", 4),
-                                              nullptr, G_DBUS_CALL_FLAGS_NONE, -1, nullptr, nullptr));
+                                              is_present ? "RequestName" : "ReleaseName", name, nullptr,
+                                              G_DBUS_CALL_FLAGS_NONE, -1, nullptr, nullptr));
 }
 
 void ServiceWorld::TearDown() {

@@ -38,8 +38,10 @@ class FakeDesk {
 
   std::string url;
   std::function<void(SoupServerMessage *)> on_report;
+  std::function<void(SoupServerMessage *)> on_file;  // unset: no answer
   int registrations = 0;
   int reports = 0;    // calls that brought one
+  int files = 0;      // calls about a file
   std::string token;  // what such a call must carry
 
  private:
@@ -56,6 +58,8 @@ class ServiceWorld : public StoreWorld {
   // A launch request to the service, with extra data.
   void launch(const std::vector<std::pair<std::string, std::string>> &extra_data);
   void launch(const char *operation, int voc_id);
+  // The client comes to the bus or leaves it; it is there from the start.
+  void set_client_present(bool is_present);
   // A stored problem report that is to be sent.
   static int store_report(const std::vector<std::string> &paths = {}, const std::string &text = "Grey boxes");
 
