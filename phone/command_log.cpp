@@ -48,7 +48,8 @@ int command_log(int argc, char **argv) {
   CommandLine line("", "Print the platform log, oldest message first.");
   line.text("dir", &dir, kDirHelp, "DIR");
   line.flag("follow", &is_following, "Go on with what is written from now on");
-  if (!line.parse(argc, argv) || !line.arguments.empty()) return kUsage;
+  if (!line.parse(argc, argv)) return kUsage;
+  if (!line.arguments.empty()) return misuse("log takes no arguments");
   Folder folder;
   if (!find_folder(dir, &folder)) return kUsage;
   const State state = read_state(folder);

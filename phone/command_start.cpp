@@ -5,6 +5,7 @@
 
 #include <cerrno>
 #include <cstdio>
+#include <optional>
 
 #include "commands.h"
 #include "monitor.h"
@@ -38,18 +39,25 @@ bool read_options(int argc, char **argv, StartOptions *options) {
   return find_folder(dir, &options->folder);
 }
 
-// Another process has the phone; it may still be starting.
-int report_running(const Folder &folder) {
+// The lock, or an empty handle and the state of the phone that runs. Another process may be starting or
+// ending the phone: its end is waited for. Nothing, after a message, when neither comes about.
+std::optional<TavroFd> take_or_find_phone(const Folder &folder, State *running) {
   constexpr int kPatienceMilliseconds = 30000;
   constexpr int kPollMilliseconds = 50;
-  State state;
-  for (int waited = 0; is_running(folder) && waited < kPatienceMilliseconds; waited += kPollMilliseconds) {
-    state = read_state(folder);
-    if (state.count("ready")) break;
+  for (int waited = 0; waited < kPatienceMilliseconds; waited += kPollMilliseconds) {
+    std::optional<TavroFd> lock = lock_folder(folder);
+    if (!lock || *lock) return lock;
+    *running = read_state(folder);
+    // One that was killed could not take back that it was ready; what remains of it is ending.
+    if (running->count("ready") && monitor_pid(*running)) return lock;
     g_usleep(kPollMilliseconds * 1000);
   }
-  if (!state.count("ready")) return fail("the phone in " + folder.dir + " is starting or ending; try again");
-  say("the phone in " + folder.dir + " already runs");
+  say("the phone in " + folder.dir + " is starting or ending; try again");
+  return std::nullopt;
+}
+
+int report_running(const State &state) {
+  say("the phone in " + state.at("dir") + " already runs");
   std::fputs(public_lines(state).c_str(), stdout);
   return kDone;
 }
@@ -96,9 +104,11 @@ int command_start(int argc, char **argv) {
   if (!read_options(argc, argv, &options)) return kUsage;
   umask(077);
   if (!create_folder(options.folder)) return kFailed;
-  const TavroFd lock = lock_folder(options.folder);
-  if (!lock) return report_running(options.folder);
-  return options.is_detached ? start_detached(options, lock) : run_phone(options, lock, -1);
+  State running;
+  const std::optional<TavroFd> lock = take_or_find_phone(options.folder, &running);
+  if (!lock) return kFailed;
+  if (!*lock) return report_running(running);
+  return options.is_detached ? start_detached(options, *lock) : run_phone(options, *lock, -1);
 }
 
 }  // namespace phone

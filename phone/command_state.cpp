@@ -5,7 +5,6 @@
 #include "commands.h"
 #include "control.h"
 #include "options.h"
-#include "process.h"
 #include "sandbox.h"
 
 namespace phone {
@@ -14,38 +13,53 @@ namespace {
 
 constexpr int kPollMilliseconds = 20;
 
-bool wait_until_stopped(const Folder &folder, int patience_ms) {
-  for (int waited = 0; is_running(folder); waited += kPollMilliseconds) {
+std::string value_of(const State &state, const std::string &key) {
+  const auto found = state.find(key);
+  return found == state.end() ? "" : found->second;
+}
+
+// Also over when a start that waited for the end has the folder: its phone is not the one to stop.
+bool is_over(const Folder &folder, const State &stopped) {
+  if (!is_running(folder)) return true;
+  const State now = read_state(folder);
+  return value_of(now, "pid") != value_of(stopped, "pid") ||
+         value_of(now, "pid_start") != value_of(stopped, "pid_start");
+}
+
+bool wait_until_over(const Folder &folder, const State &stopped, int patience_ms) {
+  for (int waited = 0; !is_over(folder, stopped); waited += kPollMilliseconds) {
     if (waited >= patience_ms) return false;
     g_usleep(kPollMilliseconds * 1000);
   }
   return true;
 }
 
-// The process that holds the phone, 0 when the recorded one is gone and its number belongs to another.
-int monitor_pid(const State &state) {
-  const auto pid_text = state.find("pid");
-  const auto start = state.find("pid_start");
-  if (pid_text == state.end() || start == state.end()) return 0;
-  const int pid = static_cast<int>(g_ascii_strtoll(pid_text->second.c_str(), nullptr, 10));
-  return pid > 1 && process_start_time(pid) == start->second ? pid : 0;
+void signal_monitor(const State &state, int number) {
+  if (const int pid = monitor_pid(state)) kill(pid, number);
 }
 
-std::string value_of(const State &state, const std::string &key) {
-  const auto found = state.find(key);
-  return found == state.end() ? "" : found->second;
+// A start has the lock before it has written who it is; the state of the last run must not be taken for it.
+State await_owner(const Folder &folder) {
+  constexpr int kPatienceMilliseconds = 1000;
+  State state = read_state(folder);
+  for (int waited = 0; !monitor_pid(state) && is_running(folder) && waited < kPatienceMilliseconds;
+       waited += kPollMilliseconds) {
+    g_usleep(kPollMilliseconds * 1000);
+    state = read_state(folder);
+  }
+  return state;
 }
 
 int stop_phone(const Folder &folder) {
   constexpr int kOrderlyMilliseconds = 20000;
   constexpr int kForcedMilliseconds = 5000;
-  const State state = read_state(folder);
-  const int pid = monitor_pid(state);
+  const State state = await_owner(folder);
   // A phone that is still starting has no control socket yet; its outer half takes a signal at any time.
-  if (!request_stop(value_of(state, "control")) && pid) kill(pid, SIGTERM);
-  if (wait_until_stopped(folder, kOrderlyMilliseconds)) return kDone;
-  if (pid) kill(pid, SIGKILL);
-  if (wait_until_stopped(folder, kForcedMilliseconds)) return fail("the phone did not end and was killed");
+  if (!request_stop(value_of(state, "control"))) signal_monitor(state, SIGTERM);
+  if (wait_until_over(folder, state, kOrderlyMilliseconds)) return kDone;
+  signal_monitor(state, SIGKILL);
+  if (wait_until_over(folder, state, kForcedMilliseconds))
+    return fail("the phone did not end and was killed");
   return fail("the phone in " + folder.dir + " cannot be ended");
 }
 

@@ -4,8 +4,10 @@
 #include <sys/un.h>
 #include <sys/wait.h>
 
+#include <algorithm>
 #include <cerrno>
 #include <cstring>
+#include <iterator>
 
 #include "control.h"
 #include "options.h"
@@ -30,11 +32,26 @@ bool is_same_user(int fd) {
   return getsockopt(fd, SOL_SOCKET, SO_PEERCRED, &peer, &size) == 0 && peer.uid == geteuid();
 }
 
+// Takes over the descriptors of one part of a packet: the free places are filled, the surplus is closed.
+void take_descriptors(const cmsghdr *part, int (&descriptors)[3]) {
+  const size_t count = (part->cmsg_len - CMSG_LEN(0)) / sizeof(int);
+  for (size_t i = 0; i < count; ++i) {
+    int fd = -1;
+    std::memcpy(&fd, CMSG_DATA(part) + i * sizeof fd, sizeof fd);
+    int *const place = std::find(std::begin(descriptors), std::end(descriptors), -1);
+    if (place != std::end(descriptors))
+      *place = fd;
+    else
+      close(fd);
+  }
+}
+
 // One packet and the descriptors that came with it; unused places stay -1. False at the end of the
 // connection.
 bool receive(int fd, std::string *packet, int (&descriptors)[3]) {
   packet->resize(kLargestRequest);
   iovec part = {packet->data(), packet->size()};
+  // Its padding has room for one descriptor more than was asked for.
   alignas(cmsghdr) char control[CMSG_SPACE(sizeof descriptors)];
   msghdr message = {};
   message.msg_iov = &part;
@@ -42,13 +59,13 @@ bool receive(int fd, std::string *packet, int (&descriptors)[3]) {
   message.msg_control = control;
   message.msg_controllen = sizeof control;
   const ssize_t size = recvmsg(fd, &message, MSG_CMSG_CLOEXEC | MSG_DONTWAIT);
-  if (size <= 0) return size < 0 && (errno == EAGAIN || errno == EINTR);
-  packet->resize(static_cast<size_t>(size));
+  if (size < 0) return errno == EAGAIN || errno == EINTR;
   for (cmsghdr *part_of = CMSG_FIRSTHDR(&message); part_of; part_of = CMSG_NXTHDR(&message, part_of)) {
     if (part_of->cmsg_level == SOL_SOCKET && part_of->cmsg_type == SCM_RIGHTS)
-      std::memcpy(descriptors, CMSG_DATA(part_of), part_of->cmsg_len - CMSG_LEN(0));
+      take_descriptors(part_of, descriptors);
   }
-  return true;
+  packet->resize(static_cast<size_t>(size));
+  return size > 0;
 }
 
 std::vector<std::string> split(const std::string &text) {

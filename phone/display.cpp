@@ -113,16 +113,19 @@ bool parse_size(const std::string &text, ScreenSize *size) {
   return true;
 }
 
-bool can_show_windows(const Environment &environment) {
-  if (environment.get("DISPLAY").empty()) return false;
+HostDisplay probe_display(const Environment &environment) {
+  if (environment.get("DISPLAY").empty()) return HostDisplay::kNone;
   TavroStrv variables = environment.to_strv();
-  const char *command[] = {"xprop", "-root", "_NET_SUPPORTING_WM_CHECK", nullptr};
+  const char *command[] = {"xwininfo", "-root", "-events", nullptr};
+  TavroGText events;
   int status = -1;
-  const auto flags =
-      static_cast<GSpawnFlags>(G_SPAWN_SEARCH_PATH | G_SPAWN_STDOUT_TO_DEV_NULL | G_SPAWN_STDERR_TO_DEV_NULL);
-  return g_spawn_sync(nullptr, const_cast<char **>(command), variables.get(), flags, nullptr, nullptr,
-                      nullptr, nullptr, &status, nullptr) &&
-         status == 0;
+  const auto flags = static_cast<GSpawnFlags>(G_SPAWN_SEARCH_PATH | G_SPAWN_STDERR_TO_DEV_NULL);
+  if (!g_spawn_sync(nullptr, const_cast<char **>(command), variables.get(), flags, nullptr, nullptr,
+                    tavro_out(events), nullptr, &status, nullptr) ||
+      status != 0)
+    return HostDisplay::kNone;
+  // Only a window manager asks for this one, whatever its kind, and no longer than it lives.
+  return std::strstr(events.get(), "SubstructureRedirect") ? HostDisplay::kUsable : HostDisplay::kUnmanaged;
 }
 
 bool write_display_files(const Folder &folder, const ScreenSize &size) {

@@ -17,8 +17,9 @@ struct ScreenSize {
 // "WIDTHxHEIGHT" in pixels, each 200 to 8192. False when it is not that.
 bool parse_size(const std::string &text, ScreenSize *size);
 
-// Whether windows can be shown on the display that the environment names.
-bool can_show_windows(const Environment &environment);
+// The display that the environment names. Without a window manager the toolkit paints nothing on it.
+enum class HostDisplay { kNone, kUnmanaged, kUsable };
+HostDisplay probe_display(const Environment &environment);
 
 // Write the files of a virtual display: its access cookie, and how window manager and notifications look.
 // False with a message.

@@ -9,6 +9,7 @@
 #include <filesystem>
 
 #include "options.h"
+#include "process.h"
 
 namespace phone {
 
@@ -76,14 +77,17 @@ bool write_private_file(const std::string &path, const std::string &contents) {
   return false;
 }
 
-TavroFd lock_folder(const Folder &folder) {
-  TavroFd fd(open(folder.run("lock").c_str(), O_RDWR | O_CREAT | O_CLOEXEC, kPrivateFileMode));
-  if (fd && flock(fd.get(), LOCK_EX | LOCK_NB) != 0) return TavroFd();
-  return fd;
+std::optional<TavroFd> lock_folder(const Folder &folder) {
+  const std::string path = folder.run("lock");
+  TavroFd fd(open(path.c_str(), O_RDWR | O_CREAT | O_CLOEXEC, kPrivateFileMode));
+  if (fd && flock(fd.get(), LOCK_EX | LOCK_NB) == 0) return fd;
+  if (fd && errno == EWOULDBLOCK) return TavroFd();
+  say("cannot lock " + path + ": " + g_strerror(errno));
+  return std::nullopt;
 }
 
 bool is_running(const Folder &folder) {
-  TavroFd fd(open(folder.run("lock").c_str(), O_RDWR | O_CLOEXEC));
+  TavroFd fd(open(folder.run("lock").c_str(), O_RDONLY | O_CLOEXEC));
   return fd && flock(fd.get(), LOCK_SH | LOCK_NB) != 0 && errno == EWOULDBLOCK;
 }
 
@@ -103,6 +107,19 @@ bool write_state(const Folder &folder, const State &state) {
   std::string text;
   for (const auto &[key, value] : state) text += key + "=" + value + "\n";
   return write_private_file(folder.run("state"), text);
+}
+
+void withdraw_ready(const Folder &folder) {
+  State state = read_state(folder);
+  if (state.erase("ready")) write_state(folder, state);
+}
+
+int monitor_pid(const State &state) {
+  const auto pid_text = state.find("pid");
+  const auto start = state.find("pid_start");
+  if (pid_text == state.end() || start == state.end()) return 0;
+  const int pid = static_cast<int>(g_ascii_strtoll(pid_text->second.c_str(), nullptr, 10));
+  return pid > 1 && process_start_time(pid) == start->second ? pid : 0;
 }
 
 std::string public_lines(const State &state) {

@@ -10,6 +10,7 @@
 #pragma once
 
 #include <map>
+#include <optional>
 #include <string>
 
 #include "tavro_handles.h"
@@ -42,12 +43,19 @@ bool create_storage(const std::string &usr);
 // Write a file of the phone's own, readable by its owner alone. False with a message.
 bool write_private_file(const std::string &path, const std::string &contents);
 
-// The phone's lock; an empty handle when another process holds it.
-TavroFd lock_folder(const Folder &folder);
+// The phone's lock; an empty handle when another process holds it, nothing, after a message, when it cannot
+// be had at all.
+std::optional<TavroFd> lock_folder(const Folder &folder);
 bool is_running(const Folder &folder);
 
 State read_state(const Folder &folder);
 bool write_state(const Folder &folder, const State &state);
+
+// A phone that begins to end takes back that it is ready before anything of it is gone.
+void withdraw_ready(const Folder &folder);
+
+// The process that holds the phone, 0 when the recorded one is gone and its number belongs to another.
+int monitor_pid(const State &state);
 
 // The lines of a state that are for people and scripts, in their fixed order.
 std::string public_lines(const State &state);

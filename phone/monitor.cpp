@@ -132,6 +132,7 @@ ExitStatus run_monitor(const StartOptions &options, const TavroFd &lock, int rea
   g_unix_fd_add(monitor.life_line.get(), static_cast<GIOCondition>(G_IO_IN | G_IO_HUP), ready_cb, &monitor);
   for (const int number : {SIGINT, SIGTERM, SIGHUP}) g_unix_signal_add(number, signal_cb, &monitor);
   while (!monitor.is_over) g_main_context_iteration(nullptr, TRUE);
+  withdraw_ready(options.folder);  // the inner half did, unless it was killed
   if (options.mode == Mode::kDirect) kill_remains(options.folder);
   return outcome(monitor);
 }

@@ -46,7 +46,7 @@ void CommandLine::flag(const char *name, bool *value, const char *help) {
 }
 
 void CommandLine::text(const char *name, std::string *value, const char *help, const char *placeholder) {
-  texts_.push_back({nullptr, value});
+  texts_.push_back({nullptr, value, name});
   // As file names, so that bytes reach us as they were typed, whatever the locale.
   entries_.push_back({name, 0, 0, G_OPTION_ARG_FILENAME, &texts_.back().raw, help, placeholder});
 }
@@ -65,11 +65,14 @@ bool CommandLine::parse(int argc, char **argv) {
   TavroStrv remaining(rest);
   for (char **item = rest; item && *item; ++item) arguments.emplace_back(*item);
   for (const Flag &flag : flags_) *flag.value = flag.raw;
+  const char *empty = nullptr;
   for (const Text &text : texts_) {
     if (text.raw) *text.value = TavroGText(text.raw).get();
+    if (text.raw && text.value->empty()) empty = text.name;
   }
-  if (!is_parsed) misuse(error->message);
-  return is_parsed;
+  if (!is_parsed) return misuse(error->message), false;
+  if (empty) return misuse(std::string("--") + empty + " must not be empty"), false;
+  return true;
 }
 
 }  // namespace phone

@@ -25,6 +25,7 @@ class CommandLine {
  public:
   CommandLine(std::string usage, std::string summary);
   void flag(const char *name, bool *value, const char *help);
+  // A value that is given must not be empty: it would pass for one that is not.
   void text(const char *name, std::string *value, const char *help, const char *placeholder);
 
   // Options end at the first word that is none, so that what follows may look like one.
@@ -43,6 +44,7 @@ class CommandLine {
   struct Text {
     char *raw;
     std::string *value;
+    const char *name;
   };
   std::string usage_;
   std::string summary_;

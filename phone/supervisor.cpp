@@ -87,6 +87,7 @@ void Supervisor::end(ExitStatus status) {
   if (is_ending_) return;
   is_ending_ = true;
   status_ = status;
+  if (state_.erase("ready")) withdraw_ready(options_.folder);
   g_main_context_wakeup(nullptr);
 }
 
@@ -126,10 +127,15 @@ bool Supervisor::open_control() {
 
 void Supervisor::choose_display() {
   const Environment current = Environment::current();
-  has_virtual_display_ = options_.is_headless || !can_show_windows(current);
+  const HostDisplay host = options_.is_headless ? HostDisplay::kNone : probe_display(current);
+  has_virtual_display_ = host != HostDisplay::kUsable;
   publish("virtual_display", has_virtual_display_ ? "1" : "0");
   if (!has_virtual_display_) publish("display", current.get("DISPLAY"));
-  if (has_virtual_display_ && !options_.is_headless) say("no display here; the phone draws on a virtual one");
+  if (host == HostDisplay::kUnmanaged) {
+    say("the display " + current.get("DISPLAY") + " has no window manager; the phone draws on a virtual one");
+  } else if (has_virtual_display_ && !options_.is_headless) {
+    say("no display here; the phone draws on a virtual one");
+  }
 }
 
 bool Supervisor::start_display() {

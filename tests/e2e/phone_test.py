@@ -116,6 +116,32 @@ def test_a_second_start_says_that_the_phone_runs_and_prints_its_values(phone):
     assert "already runs" in second.stderr
 
 
+@needs_sandbox
+@pytest.mark.parametrize("is_in_place", [False, True])
+@pytest.mark.parametrize("end", ["stop", "kill"])
+def test_a_start_while_the_phone_ends_waits_and_starts_anew(phone, tmp_path, end, is_in_place):
+    def run(*words):
+        line = [phone.program, words[0], "--dir", phone.directory, *words[1:]]
+        return subprocess.Popen(in_place(line, ["--bind", str(tmp_path), "/opt/usr"]) if is_in_place else line,
+                                stdout=subprocess.PIPE, text=True)
+    start = ["start", "--headless", "--detach"]
+    run(*start).communicate(timeout=30)
+    state_file = phone.directory / "run" / "state"
+    first = dict(line.split("=", 1) for line in state_file.read_text().splitlines())
+    if end == "stop":
+        ending = run("stop")
+        wait_until(lambda: "ready=" not in state_file.read_text(), what="the beginning of the end")
+    else:
+        os.kill(int(first["pid"]), signal.SIGKILL)
+    text, _ = run(*start).communicate(timeout=30)
+    if end == "stop":
+        assert ending.wait(5) == 0
+    second = dict(line.split("=", 1) for line in state_file.read_text().splitlines())
+    assert "ready=1" in text and second["pid"] != first["pid"]
+    assert "the message bus: runs" in run("status").communicate()[0]
+    assert run("stop").wait(20) == 0 and processes_of(phone) == []
+
+
 def test_the_desk_keeps_its_address_across_starts_unless_it_is_taken(phone):
     first = phone.start().state["desk"]
     phone.stop()
@@ -174,7 +200,7 @@ def test_wrong_uses_and_failures_are_told_apart_by_exit_status(phone):
              (["launch", CLIENT, b"k=\xff"], 2), (["launch"], 2), (["exec"], 2), (["screenshot"], 2),
              (["screenshot", "/no/such/folder/file.png"], 1), (["preference", "get"], 2),
              (["start", "--size", "1x1"], 2), (["start", "--desk", "ftp://x"], 2), (["stop", "--what"], 2),
-             (["nonsense"], 2), (["start", "--help"], 0), (["--help"], 0)]
+             (["log", "word"], 2), (["status", "--dir", ""], 2), (["nonsense"], 2), (["start", "--help"], 0), (["--help"], 0)]
     for words, status in cases:
         line = [phone.program, words[0], "--dir", str(phone.directory), *words[1:]]
         result = subprocess.run(line if words[0] != "--help" else line[:2], capture_output=True)
@@ -311,9 +337,14 @@ def desktop(tmp_path):
                            stderr=subprocess.DEVNULL)
     os.close(write_end)
     number = os.read(read_end, 16).decode().strip()
-    yield {"DISPLAY": f":{number}", "DBUS_SESSION_BUS_ADDRESS": bus.stdout.readline().strip()}
+    manager = subprocess.Popen(["openbox", "--sm-disable"], env={**os.environ, "DISPLAY": f":{number}"},
+                               stderr=subprocess.DEVNULL)
+    wait_until(lambda: "window id" in subprocess.run(
+        ["xprop", "-display", f":{number}", "-root", "_NET_SUPPORTING_WM_CHECK"], capture_output=True, text=True).stdout)
+    yield {"DISPLAY": f":{number}", "DBUS_SESSION_BUS_ADDRESS": bus.stdout.readline().strip(),
+           "WINDOW_MANAGER_PID": str(manager.pid)}
     os.close(read_end)
-    for process in (bus, display):
+    for process in (manager, bus, display):
         process.terminate()
         process.wait()
 
@@ -338,6 +369,14 @@ def test_on_a_desktop_the_phone_uses_its_display_its_bus_and_its_screen_reader(p
     assert "false" in phone.execute(*READER_IS_ON).stdout
     subprocess.run(SWITCH_READER_ON, env=host, check=True, stdout=subprocess.DEVNULL)
     wait_until(lambda: "true" in phone.execute(*READER_IS_ON).stdout)
+
+
+def test_on_a_display_without_a_window_manager_the_phone_draws_on_its_own(phone, desktop):
+    phone.environment.update(desktop)
+    os.kill(int(desktop["WINDOW_MANAGER_PID"]), signal.SIGKILL)
+    started = phone.command("start", "--detach", "--no-client")
+    assert "has no window manager" in started.stderr and f"display={desktop['DISPLAY']}\n" not in started.stdout
+    assert "the window manager" in phone.status()
 
 
 def test_a_headless_phone_leaves_the_desktop_of_its_user_alone(phone, desktop):

@@ -56,9 +56,12 @@ TEST_F(PhoneFolderTest, AStateWithoutItsLockIsOnlyAMemory) {
   EXPECT_EQ(read_state(folder_)["bus"], "unix:path=/a,guid=b");
   EXPECT_EQ(public_lines(read_state(folder_)), "dir=" + folder_.dir + "\nbus=unix:path=/a,guid=b\n");
   EXPECT_FALSE(is_running(folder_));
-  const TavroFd lock = lock_folder(folder_);
-  EXPECT_TRUE(lock && is_running(folder_));
-  EXPECT_FALSE(lock_folder(folder_));
+  const auto lock = lock_folder(folder_);
+  ASSERT_TRUE(lock && *lock);
+  EXPECT_TRUE(is_running(folder_));
+  const auto second = lock_folder(folder_);
+  EXPECT_TRUE(second && !*second);
+  EXPECT_FALSE(lock_folder({folder_.dir + "/none"}));
 }
 
 TEST_F(PhoneFolderTest, SocketPathsStayShortAndThoseOfAKilledPhoneAreGone) {
