@@ -58,8 +58,8 @@ notification_h notification_create(notification_type_e type) {
   auto *noti = new (std::nothrow) _notification{type, {}, nullptr, nullptr};
   if (!noti) return nullptr;
   noti->content.is_ongoing = type == NOTIFICATION_TYPE_ONGOING;
-  // What is going on stays until it is over; news stay until they are read.
-  noti->content.expire_ms = 0;
+  // What is going on stays until it is over; for how long news are shown is the desktop's to say.
+  noti->content.expire_ms = noti->content.is_ongoing ? 0 : -1;
   return noti;
 }
 

@@ -1,6 +1,8 @@
 #include <app_manager.h>
 #include <gmock/gmock.h>
 
+#include <cstdlib>
+
 #include "platform_support.h"
 
 namespace {
@@ -167,6 +169,9 @@ class WindowLifeCycle : public LaunchRequest {
     display_ = ":" + std::to_string(atoi(number));
     setenv("DISPLAY", display_.c_str(), 1);
     manager_ = start({"openbox"});
+    // A window that is mapped before the manager works is not managed, and cannot be iconified.
+    const char *has_manager = "xprop -root _NET_SUPPORTING_WM_CHECK 2>/dev/null | grep -q 'window id'";
+    ASSERT_TRUE(wait_for([=] { return std::system(has_manager) == 0; }));
     make_startable(kWindow, "DISPLAY=" + display_);
   }
   void TearDown() override {
@@ -185,7 +190,9 @@ TEST_F(WindowLifeCycle, GoesFromCreateToLaunchToResumeAndPausesWhileItIsOutOfSig
   const std::string kDefault = APP_CONTROL_OPERATION_DEFAULT;
   ASSERT_EQ(send(kWindow, kDefault), 0);
   ASSERT_TRUE(wait_for([] { return count_in_record(kWindow, "resume") == 1; }));
-  g_usleep(500'000);  // the window is mapped by now
+  const char *is_managed = "xprop -root _NET_CLIENT_LIST 2>/dev/null | grep -q '# 0x'";
+  ASSERT_TRUE(wait_for([=] { return std::system(is_managed) == 0; }));
+  g_usleep(300'000);  // and its visibility has been told
   ASSERT_EQ(send(kWindow, "iconify"), 0);
   ASSERT_TRUE(wait_for([] { return count_in_record(kWindow, "pause") == 1; }));
   ASSERT_EQ(send(kWindow, kDefault), 0);
