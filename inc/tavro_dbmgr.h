@@ -147,6 +147,10 @@ enum tavro_dbmgr_store_state {
 // once.
 tavro_dbmgr_store_state tavro_dbmgr_ensure_schema();
 
+// Whether a store was set aside, by this program or the other, and the person does not know yet.
+bool tavro_dbmgr_is_replacement_untold();
+void tavro_dbmgr_set_replacement_told();
+
 // Create the tables and the built-in banner without taking the lock. Returns -1 only when the file cannot be
 // opened; on an existing store it stops at the banner with a log line and returns 0.
 int tavro_dbmgr_init();
@@ -218,7 +222,9 @@ char *tavro_dbmgr_get_app_id_by_name(const char *app_name);
 
 // All reports and attachments; extension rows stay.
 void tavro_dbmgr_destroy_vocs();
-// One report with its attachments and its extension row.
+// One report with its attachments and its extension row: three critical sections in this order, the report's
+// row last, so an end of the process in between leaves a report without title and attachments, to be deleted
+// again.
 void tavro_dbmgr_destroy_vocs_by_id(int voc_id);
 void tavro_dbmgr_destroy_attachments_by_filename(const char *file_path);
 // All reports of one kind, without their attachments and extension rows.

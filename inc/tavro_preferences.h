@@ -22,8 +22,6 @@ constexpr char TAVRO_PREF_QUALITY[] = "tavro_quality";                          
 constexpr char TAVRO_PREF_PREFERENCE[] = "tavro_preference";                          // int: first run
 constexpr char TAVRO_PREF_NEW_WELCOME_PREFERENCE[] = "tavro_new_welcome_preference";  // int
 constexpr char TAVRO_PREF_UPDATE[] = "tavro_update";  // string: "updated" once a minor update was offered
-constexpr char TAVRO_PREF_STORE_REPLACED[] =
-    "tavro_store_replaced";  // boolean: the service set a damaged store aside, the person does not know yet
 
 // The account; all but the maker's user name are removed at log-out.
 constexpr char TAVRO_PREF_USERNAME[] = "tavro_username";

@@ -8,6 +8,10 @@ struct appdata;
 // Once per process, before anything reads the store; later calls do nothing.
 void tavro_prepare_store();
 
+// Complete the save that a process left unfinished, and have the report sent if it was being sent. Also
+// before each save, since there is one note only.
+void tavro_finish_interrupted_save();
+
 // Tell the person that the stored reports could not be read and were set aside. Once, and only when it
 // happened and a window is there.
 void tavro_tell_store_was_replaced(appdata *ad);

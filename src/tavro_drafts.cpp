@@ -1,10 +1,12 @@
 #include "tavro_drafts.h"
 
 #include <notification.h>
+#include <unistd.h>
 
 #include <cerrno>
 #include <cstring>
 #include <memory>
+#include <utility>
 
 #include "tavro-common.h"
 #include "tavro-main.h"
@@ -14,6 +16,7 @@
 #include "tavro_log.h"
 #include "tavro_notifications.h"
 #include "tavro_preferences.h"
+#include "tavro_recovery.h"
 #include "tavro_report_files.h"
 #include "tavro_save_journal.h"
 #include "tavro_service_bridge.h"
@@ -95,6 +98,40 @@ Suggestion _make_suggestion(const appdata *ad, const char *user_name, int status
   return suggestion;
 }
 
+// The screen that is open has an automatic copy which could be noted only. The note protects it until the
+// screen is saved again.
+bool open_screen_is_noted = false;
+
+// The device status file was made for this report alone.
+void _discard_files(const tavro_dbmgr_bug_report_info *report) {
+  const char *path = report->device_data_filepath;
+  if (path && *path && unlink(path) == -1 && errno != ENOENT)
+    TAVRO_LOGE("device status file %s: %s", path, std::strerror(errno));
+}
+
+void _discard_files(const tavro_dbmgr_suggestion_info *) {}
+
+// The id of the report when all of it was stored, else below 1.
+template <typename Report>
+int _store(const appdata *ad, Report *report, int (*save)(Report *), on_failed_store failed) {
+  if (std::exchange(open_screen_is_noted, false)) tavro_journal_abandon();
+  tavro_finish_interrupted_save();
+  if (tavro_journal_write(report) != 0) {
+    _discard_files(report);
+    return -1;
+  }
+  const int id = tavro_journal_clear(save(report));
+  if (id >= 1) return id;
+  if (failed == on_failed_store::keep_screen) {
+    // A report that stays on the screen must not come back by itself when it is discarded there.
+    tavro_journal_abandon();
+    _discard_files(report);
+  } else {
+    open_screen_is_noted = ad->auto_saved_id != 0;
+  }
+  return id;
+}
+
 void _after_store(appdata *ad, int id, int status) {
   if (id < 1) {
     TAVRO_LOGE("the report could not be stored: %d", id);
@@ -119,15 +156,6 @@ void _forget_copies(compose_view_win *view) {
   TAVRO_FREE(view->title_description);
 }
 
-void _end_journal(int id, on_failed_store failed) {
-  // A report that stays on the screen must not come back by itself when it is discarded there.
-  if (id < 1 && failed == on_failed_store::keep_screen) {
-    tavro_journal_clear();
-  } else {
-    tavro_journal_clear(id);
-  }
-}
-
 }  // namespace
 
 int tavro_drafts_save_problem(appdata *ad, int status, on_failed_store failed) {
@@ -139,9 +167,7 @@ int tavro_drafts_save_problem(appdata *ad, int status, on_failed_store failed) {
   }
   _begin_save(ad, ad->problem_view, status);
   const BugReport report = _make_report(ad, user_name.get(), status);
-  tavro_journal_write(report.get());
-  const int id = tavro_dbmgr_update_bug_report(report.get());
-  _end_journal(id, failed);
+  const int id = _store(ad, report.get(), tavro_dbmgr_update_bug_report, failed);
   _after_store(ad, id, status);
   if (_screen_stays(ad, id, failed)) {
     _forget_copies(ad->problem_view);
@@ -161,9 +187,7 @@ int tavro_drafts_save_idea(appdata *ad, int status, on_failed_store failed) {
   }
   _begin_save(ad, ad->idea_view, status);
   const Suggestion suggestion = _make_suggestion(ad, user_name.get(), status);
-  tavro_journal_write(suggestion.get());
-  const int id = tavro_dbmgr_update_suggestion(suggestion.get());
-  _end_journal(id, failed);
+  const int id = _store(ad, suggestion.get(), tavro_dbmgr_update_suggestion, failed);
   _after_store(ad, id, status);
   if (_screen_stays(ad, id, failed)) {
     _forget_copies(ad->idea_view);

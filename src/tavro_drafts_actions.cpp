@@ -52,14 +52,13 @@ int _save_by_kind(appdata *ad, int status) {
 // The draft that the screen came from and its automatic copy go when the new record is stored: a store that
 // refuses the record, or an end of the process in between, then loses neither.
 int _end_compose_screen(appdata *ad, int status) {
+  if (ad->problem_view) ad->problem_view->server_size_error = false;  // of an earlier try
   const int opened_from = ad->id_to_delete;
   const int auto_saved = ad->auto_saved_id;
   ad->auto_saved_id = 0;
   const int id = _save_by_kind(ad, status);
   if (id < 1) {
     ad->auto_saved_id = auto_saved;
-    if (ad->problem_view || ad->idea_view)
-      notification_status_message_post(tavro_text("IDS_OB_HEADER_NOT_STORED"));
     return id;
   }
   if (opened_from >= 1) tavro_dbmgr_destroy_vocs_by_id(opened_from);

@@ -1,7 +1,10 @@
+#include <unistd.h>
+
 #include <cstdio>
 #include <cstring>
 #include <ctime>
 #include <initializer_list>
+#include <string>
 
 #include "tavro-common.h"
 #include "tavro_dbmgr.h"
@@ -17,6 +20,16 @@ constexpr char kMediaFolder[] = "/opt/usr/media/VantorCommunity/";
 const char *_file_type(const char *path) {
   if (std::strstr(path, "jpg")) return "jpg";
   return std::strstr(path, "png") ? "png" : "mp4";
+}
+
+// Names are as fine as a second: the file of a report sent in the same one is kept.
+std::string _unused_name(const std::string &name) {
+  const std::size_t ending = name.rfind('.');
+  std::string unused = name;
+  for (int number = 2; !name.empty() && access(unused.c_str(), F_OK) == 0; number++) {
+    unused = name.substr(0, ending) + "_" + std::to_string(number) + name.substr(ending);
+  }
+  return unused;
 }
 
 void _free_text(gpointer data) {
@@ -59,9 +72,10 @@ GSList *tavro_populate_attachment_info(const GSList *paths) {
 void tavro_add_extra_data_file(tavro_dbmgr_bug_report_info *report) {
   char filename[kGeneratedFilenameSize] = {};
   tavro_generate_filename(filename, "txt");
-  if (*filename) tavro_get_extra_device_data(filename);
+  const std::string path = _unused_name(filename);
+  if (!path.empty()) tavro_get_extra_device_data(path.c_str());
   TAVRO_FREE(report->device_data_filepath);
-  report->device_data_filepath = TAVRO_STRDUP(filename);
+  report->device_data_filepath = TAVRO_STRDUP(path.c_str());
 }
 
 bool isLogMandatory(const char *appname) {

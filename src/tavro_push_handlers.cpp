@@ -14,7 +14,7 @@
 #include "tavro_preferences.h"
 #include "tavro_request.h"
 #include "tavro_screens.h"
-#include "tavro_service_events.h"
+#include "tavro_service_keys.h"
 #include "tavro_start.h"
 
 namespace {

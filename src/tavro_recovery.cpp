@@ -8,16 +8,16 @@
 #include "tavro_handles.h"
 #include "tavro_history_text.h"
 #include "tavro_log.h"
-#include "tavro_preferences.h"
 #include "tavro_save_journal.h"
 #include "tavro_service_bridge.h"
 
 namespace {
 
 bool is_prepared = false;
-bool replacement_is_untold = false;
 
-void _finish_interrupted_save() {
+}  // namespace
+
+void tavro_finish_interrupted_save() {
   const int id = tavro_journal_recover();
   if (id < 1) return;
   const TavroHandle<svc_voc_data, tavro_dbmgr_free_voc_data> voc(tavro_dbmgr_get_voc_by_id(id));
@@ -27,22 +27,16 @@ void _finish_interrupted_save() {
   }
 }
 
-}  // namespace
-
 void tavro_prepare_store() {
   if (is_prepared) return;
   is_prepared = true;
-  const tavro_dbmgr_store_state state = tavro_dbmgr_ensure_schema();
-  if (state == TAVRO_STORE_UNUSABLE) return;
-  replacement_is_untold =
-      state == TAVRO_STORE_REPLACED || tavro_preference_flag(TAVRO_PREF_STORE_REPLACED, false);
-  _finish_interrupted_save();
+  if (tavro_dbmgr_ensure_schema() == TAVRO_STORE_UNUSABLE) return;
+  tavro_finish_interrupted_save();
 }
 
 void tavro_tell_store_was_replaced(appdata *ad) {
-  if (!replacement_is_untold || !ad->win) return;
-  replacement_is_untold = false;
-  preference_remove(TAVRO_PREF_STORE_REPLACED);
+  if (!ad->win || !tavro_dbmgr_is_replacement_untold()) return;
+  tavro_dbmgr_set_replacement_told();
   tavro_popup_show(ad, &ad->history_file_popup, tavro_text("IDS_OB_HEADER_REPORTS_NOT_READABLE"),
                    tavro_text("IDS_OB_POP_REPORTS_NOT_READABLE_SET_ASIDE"),
                    {{tavro_text("IDS_OB_BUTTON_OK"), nullptr}});

@@ -6,9 +6,11 @@
 #include "tavro-main.h"
 #include "tavro_appdata.h"
 #include "tavro_dbmgr.h"
+#include "tavro_handles.h"
 #include "tavro_history_text.h"
 #include "tavro_log.h"
 #include "tavro_notifications.h"
+#include "tavro_screens.h"
 #include "tavro_service_bridge.h"
 
 namespace {
@@ -35,10 +37,23 @@ bool _nothing_is_left(const svc_voc_data *voc) {
   return missing_count == g_slist_length(voc->attachments);
 }
 
+// The record may be older than the store: the service may have sent the report meanwhile.
+int _status_now(int voc_id) {
+  const TavroHandle<svc_voc_data, tavro_dbmgr_free_voc_data> voc(tavro_dbmgr_get_voc_by_id(voc_id));
+  return voc ? tavro_current_status(voc->submitted) : -1;
+}
+
 void _send_again(appdata *ad, const svc_voc_data *voc) {
+  const int status = _status_now(voc->id);
+  const bool is_draft = status == TAVRO_STATUS_DRAFT_SAVED;
+  if (!is_draft && status != TAVRO_STATUS_SENDING_FAILED &&
+      status != TAVRO_STATUS_SENDING_FAILED_NO_NETWORK) {
+    TAVRO_LOGD("report %d has the status %d now and is not sent again", voc->id, status);
+    tavro_update_history_page(nullptr, ad);
+    return;
+  }
   tavro_create_notification(tavro_text("IDS_OB_TPOP_SENDING_FEEDBACK_ING_ABB"), voc->description, ad);
-  // A draft keeps its state while it is being sent, so that it is a draft again when sending fails.
-  const bool is_draft = tavro_current_status(voc->submitted) == TAVRO_STATUS_DRAFT_SAVED;
+  // A draft keeps its state while it is being sent; the service leaves it so when sending fails.
   tavro_dbmgr_update_sending_state(voc->id, is_draft ? TAVRO_STATUS_DRAFT_SAVED : TAVRO_STATUS_SENDING);
   if (tavro_dbmgr_update_read_push_notifications(voc->id, kIsRead) != 0) {
     TAVRO_LOGD("Failed to update the VOC as read");

@@ -1,11 +1,14 @@
 #include "tavro_save_journal.h"
 
 #include <fcntl.h>
+#include <sys/file.h>
+#include <time.h>
 #include <unistd.h>
 
 #include <cerrno>
 #include <cstring>
 #include <string>
+#include <utility>
 
 #include "dbmgr/tavro_dbmgr_internal.h"
 #include "tavro_log.h"
@@ -15,6 +18,11 @@ namespace {
 constexpr char kPath[] = TAVRO_DBMGR_FOLDER "/.tavro.save";
 constexpr char kUnfinishedPath[] = TAVRO_DBMGR_FOLDER "/.tavro.save.new";
 constexpr char kDamagedPath[] = TAVRO_DBMGR_FOLDER "/.tavro.save.damaged";
+constexpr char kAbandonedPath[] = TAVRO_DBMGR_FOLDER "/.tavro.save.abandoned";
+constexpr char kLockPath[] = TAVRO_DBMGR_FOLDER "/.tavro.save.lock";
+
+constexpr long kLockPollNanoseconds = 10 * 1000 * 1000;
+constexpr int kLockPolls = 200;
 
 // Group and keys of the file. A missing key is a null text.
 constexpr char kReport[] = "report";
@@ -60,12 +68,6 @@ const char *_type(const problem *) {
 const char *_type(const idea *) {
   return TAVRO_DBMGR_SUGGESTION;
 }
-const char *_description(const problem *report) {
-  return report->description;
-}
-const char *_description(const idea *report) {
-  return report->suggestion;
-}
 int _save(problem *report) {
   return tavro_dbmgr_update_bug_report(report);
 }
@@ -77,6 +79,30 @@ void _save_extension(const problem *report, int id) {
 }
 void _save_extension(const idea *report, int id) {
   tavro_dbmgr_update_suggestion_extended(report, id);
+}
+
+// From the note to the end of the save, so that a client which starts while an earlier one is still ending
+// does not complete a save that is under way.
+TavroFd save_lock;
+unsigned int attachments_being_saved = 0;
+
+bool _lock() {
+  if (save_lock) return true;
+  TavroFd lock(open(kLockPath, O_RDWR | O_CREAT | O_NOFOLLOW | O_CLOEXEC, 0600));
+  if (!lock) return false;
+  const timespec pause = {0, kLockPollNanoseconds};
+  for (int i = 0; i < kLockPolls; i++) {
+    if (flock(lock.get(), LOCK_EX | LOCK_NB) == 0) {
+      save_lock = std::move(lock);
+      return true;
+    }
+    nanosleep(&pause, nullptr);
+  }
+  return false;
+}
+
+void _unlock() {
+  save_lock = TavroFd();
 }
 
 struct report_deleter {
@@ -157,10 +183,24 @@ bool _write_file(const char *data, gsize size) {
   return folder && fsync(folder.get()) == 0;
 }
 
+void _remove(const char *path) {
+  if (unlink(path) == -1 && errno != ENOENT) TAVRO_LOGE("save journal stays: %s", std::strerror(errno));
+}
+
+int _refuse(const char *reason) {
+  TAVRO_LOGE("save cannot be protected: %s", reason);
+  _unlock();
+  return -1;
+}
+
 template <typename Report>
 int _write(const Report *report) {
   if (!report) return -1;
+  if (!_lock()) return _refuse(std::strerror(errno));
+  if (access(kPath, F_OK) == 0 || access(kAbandonedPath, F_OK) == 0)
+    return _refuse("an earlier save is not finished");
   const int last_voc_id = store_last_voc_id();
+  if (last_voc_id < 0) return _refuse("no store");
   const TavroKeyFile file(g_key_file_new());
   g_key_file_set_string(file.get(), kReport, kType, _type(report));
   g_key_file_set_integer(file.get(), kReport, kSubmitted, report->submitted);
@@ -169,9 +209,13 @@ int _write(const Report *report) {
   _note_attachments(file.get(), report->attachments);
   gsize size = 0;
   const TavroGText data(g_key_file_to_data(file.get(), &size, nullptr));
-  if (last_voc_id >= 0 && _write_file(data.get(), size)) return 0;
-  TAVRO_LOGE("save is not protected: %s", last_voc_id < 0 ? "no store" : std::strerror(errno));
-  return -1;
+  if (!_write_file(data.get(), size)) {
+    const int reason = errno;
+    _remove(kPath);
+    return _refuse(std::strerror(reason));
+  }
+  attachments_being_saved = g_slist_length(report->attachments);
+  return 0;
 }
 
 template <typename Report>
@@ -184,22 +228,39 @@ std::unique_ptr<Report, report_deleter> _noted_report(GKeyFile *file) {
   return report;
 }
 
-// The id of the noted report, in whatever state its save is: stored now if it was not. Below 1 on failure.
-template <typename Report>
-int _complete(GKeyFile *file) {
-  const auto report = _noted_report<Report>(file);
+// The row of the noted report, however much of it was stored; 0 for none, -1 on failure.
+int _noted_row(GKeyFile *file) {
   int noted_id = g_key_file_get_integer(file, kReport, kLastVocId, nullptr);
   // Ids only grow, so a lower one means that the store was replaced since.
   const int last_id = store_last_voc_id();
+  if (last_id < 0) return -1;
   if (last_id < noted_id) noted_id = 0;
-  const int id =
-      store_find_voc_above(noted_id, _type(report.get()), report->user_name, _description(report.get()));
-  if (last_id < 0 || id < 0) return -1;
-  if (id == 0) return _save(report.get());
-  if (store_is_voc_complete(id)) return id;
-  store_replace_attachments(report->attachments, id);
-  _save_extension(report.get(), id);
-  return id;
+  const TavroGText type(g_key_file_get_string(file, kReport, kType, nullptr));
+  const TavroText user_name(_get_text(file, kReport, "user_name"));
+  const TavroText description(_get_text(file, kReport, "description"));
+  return store_find_voc_above(noted_id, type.get(), user_name.get(), description.get());
+}
+
+// A save whose row was refused leaves its attachments and its extension row behind, under no report.
+int _without_remains(int voc_id) {
+  if (voc_id == 0) tavro_dbmgr_destroy_vocs_by_id(voc_id);
+  return voc_id;
+}
+
+// The id of the noted report, stored now as far as it was not. Below 1 when it still is not complete.
+template <typename Report>
+int _complete(GKeyFile *file) {
+  const auto report = _noted_report<Report>(file);
+  const unsigned int attachment_count = g_slist_length(report->attachments);
+  int id = _noted_row(file);
+  if (id < 0) return -1;
+  if (id == 0) {
+    id = _without_remains(_save(report.get()));
+  } else {
+    if (!store_has_attachments(id, attachment_count)) store_replace_attachments(report->attachments, id);
+    if (!store_is_voc_complete(id)) _save_extension(report.get(), id);
+  }
+  return store_is_voc_complete(id) && store_has_attachments(id, attachment_count) ? id : 0;
 }
 
 void _set_damaged_aside(const char *reason) {
@@ -207,25 +268,8 @@ void _set_damaged_aside(const char *reason) {
   rename(kPath, kDamagedPath);
 }
 
-}  // namespace
-
-int tavro_journal_write(const tavro_dbmgr_bug_report_info *report) {
-  return _write(report);
-}
-
-int tavro_journal_write(const tavro_dbmgr_suggestion_info *suggestion) {
-  return _write(suggestion);
-}
-
-void tavro_journal_clear() {
-  if (unlink(kPath) == -1 && errno != ENOENT) TAVRO_LOGE("save journal stays: %s", std::strerror(errno));
-}
-
-void tavro_journal_clear(int voc_id) {
-  if (store_is_voc_complete(voc_id)) tavro_journal_clear();
-}
-
-int tavro_journal_recover() {
+// The noted report, complete now; 0 when there is none, or it cannot be completed yet.
+int _recover() {
   const TavroKeyFile file(g_key_file_new());
   TavroError error;
   if (!g_key_file_load_from_file(file.get(), kPath, G_KEY_FILE_NONE, tavro_out(error))) {
@@ -240,10 +284,73 @@ int tavro_journal_recover() {
     id = _complete<tavro_dbmgr_suggestion_info>(file.get());
   } else {
     _set_damaged_aside("unknown type");
+  }
+  if (id < 1) return 0;
+  _remove(kPath);
+  TAVRO_LOGD("interrupted save completed: %d", id);
+  return id;
+}
+
+// Take what was stored of an abandoned report out of the store. A full disk may refuse that too: then the
+// note stays, and it is tried again before the next save.
+void _drop_abandoned() {
+  const TavroKeyFile file(g_key_file_new());
+  TavroError error;
+  if (!g_key_file_load_from_file(file.get(), kAbandonedPath, G_KEY_FILE_NONE, tavro_out(error))) {
+    if (!g_error_matches(error.get(), G_FILE_ERROR, G_FILE_ERROR_NOENT)) _remove(kAbandonedPath);
+    return;
+  }
+  _without_remains(0);
+  const int last_id = store_last_voc_id();
+  // In a store that was replaced since, a row with these texts is another report.
+  const bool is_same_store = last_id >= g_key_file_get_integer(file.get(), kReport, kLastVocId, nullptr);
+  const int id = is_same_store ? _noted_row(file.get()) : 0;
+  if (last_id < 0 || id < 0) return;
+  if (id >= 1) tavro_dbmgr_destroy_vocs_by_id(id);
+  const int left = id >= 1 ? _noted_row(file.get()) : 0;
+  if (id == 0 || (left >= 0 && left != id)) _remove(kAbandonedPath);
+}
+
+}  // namespace
+
+int tavro_journal_write(const tavro_dbmgr_bug_report_info *report) {
+  return _write(report);
+}
+
+int tavro_journal_write(const tavro_dbmgr_suggestion_info *suggestion) {
+  return _write(suggestion);
+}
+
+void tavro_journal_clear() {
+  _remove(kPath);
+  _unlock();
+}
+
+int tavro_journal_clear(int voc_id) {
+  _without_remains(voc_id);
+  if (store_is_voc_complete(voc_id) && store_has_attachments(voc_id, attachments_being_saved)) {
+    tavro_journal_clear();
+    return voc_id;
+  }
+  _unlock();
+  return voc_id < 0 ? voc_id : 0;
+}
+
+void tavro_journal_abandon() {
+  if (!_lock()) return;
+  if (rename(kPath, kAbandonedPath) == -1 && errno != ENOENT)
+    TAVRO_LOGE("save journal stays: %s", std::strerror(errno));
+  _drop_abandoned();
+  _unlock();
+}
+
+int tavro_journal_recover() {
+  if (!_lock()) {
+    if (errno != ENOENT) TAVRO_LOGE("another client is saving, or no lock: %s", std::strerror(errno));
     return 0;
   }
-  if (!store_is_voc_complete(id)) return 0;
-  tavro_journal_clear();
-  TAVRO_LOGD("interrupted save completed: %d", id);
+  _drop_abandoned();
+  const int id = _recover();
+  _unlock();
   return id;
 }

@@ -1,5 +1,6 @@
 #include "tavro_service_events.h"
 
+#include <algorithm>
 #include <cstring>
 
 #include "tavro-common.h"
@@ -119,10 +120,15 @@ void tavro_handle_badge_notifications(app_control_h service, appdata *ad) {
   const TavroText user_name = _read_user_name();
   const TavroText reply = tavro_request_text(service, TAVRO_SERVER_PUSH_NOTI_VOC_COMMENTS);
   if (!reply) TAVRO_LOGD("Null voc_comments");
-  if (user_name) ad->push_noti_count = tavro_dbmgr_get_unread_push_notification_count(user_name.get());
-  if (ad->push_noti_count < 1) return;
-  tavro_remove_noti_badge_on_appicon();
-  tavro_create_noti_badge_on_appicon(ad->push_noti_count);
+  const int count = user_name ? tavro_dbmgr_get_unread_push_notification_count(user_name.get()) : 0;
+  // A store that cannot be counted keeps the count that was known, and the reply is told all the same.
+  const bool is_counted = count >= 0;
+  if (user_name) ad->push_noti_count = is_counted ? count : std::max(ad->push_noti_count, 0);
+  if (is_counted && ad->push_noti_count < 1) return;
+  if (ad->push_noti_count >= 1) {
+    tavro_remove_noti_badge_on_appicon();
+    tavro_create_noti_badge_on_appicon(ad->push_noti_count);
+  }
   const TavroText id_text = tavro_request_text(service, TAVRO_SERVER_PUSH_NOTI_VOC_ID);
   tavro_create_push_notification(reply.get(), tavro_record_id_from_text(id_text.get()));
   if (ad->layout) {

@@ -165,5 +165,6 @@ int store_last_voc_id();
 int store_find_voc_above(int voc_id, const char *type, const char *user_name, const char *description);
 // Whether the save of a report came to its end, the extension row.
 bool store_is_voc_complete(int voc_id);
+bool store_has_attachments(int voc_id, unsigned int count);
 // Write the attachments of a report anew.
 void store_replace_attachments(const GSList *attachments, int voc_id);

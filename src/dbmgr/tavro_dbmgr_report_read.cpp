@@ -283,3 +283,11 @@ bool store_is_voc_complete(int voc_id) {
   sa_strcat(sql, "SELECT count(*) FROM TABLE_VOC_EXTENDED WHERE VOC_ID = ", voc_id, ";");
   return store_read_number(store.db(), sql.c_str(), 0) > 0;
 }
+
+bool store_has_attachments(int voc_id, unsigned int count) {
+  const store_session store;
+  if (!store) return false;
+  statement_text sql;
+  sa_strcat(sql, "SELECT count(*) FROM ATTACHMENT WHERE ATTACHMENT_SUGGESTION_ID = ", voc_id, ";");
+  return store_read_number(store.db(), sql.c_str(), -1) == static_cast<int>(count);
+}

@@ -14,6 +14,8 @@ int _insert_report(const statement_text &sql, const GSList *attachments) {
   const int id = is_stored ? static_cast<int>(sqlite3_last_insert_rowid(db.get())) : 0;
   TAVRO_LOGD("Inserted Row ID: %d", id);
   db.reset();
+  // Kept: a refused report's attachments, and its extension row, are stored under id 0 all the same. The
+  // client removes them.
   store_add_attachments(attachments, id);
   return id;
 }

@@ -144,6 +144,9 @@ std::string _dated_name() {
   return free_name;
 }
 
+// Stays until the person was told, whichever program found the damage.
+constexpr char kReplacedMark[] = TAVRO_DBMGR_FOLDER "/.tavro.db.replaced";
+
 // SQLite's journal goes first: left behind, it would be rolled back into the new store.
 bool _set_aside() {
   const std::string name = _dated_name();
@@ -153,6 +156,7 @@ bool _set_aside() {
     return false;
   }
   TAVRO_LOGE("store is no database, kept as %s", name.c_str());
+  const TavroFd mark(open(kReplacedMark, O_WRONLY | O_CREAT | O_CLOEXEC, 0600));
   return true;
 }
 
@@ -179,6 +183,14 @@ tavro_dbmgr_store_state _mend(contents found) {
 }
 
 }  // namespace
+
+bool tavro_dbmgr_is_replacement_untold() {
+  return access(kReplacedMark, F_OK) == 0;
+}
+
+void tavro_dbmgr_set_replacement_told() {
+  unlink(kReplacedMark);
+}
 
 tavro_dbmgr_store_state tavro_dbmgr_ensure_schema() {
   if (g_mkdir_with_parents(TAVRO_DBMGR_FOLDER, 0700) == -1) {

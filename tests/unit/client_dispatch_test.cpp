@@ -145,6 +145,28 @@ TEST_F(Dispatch, AReplyRaisesBadgeAndNotificationAndRefreshesWhatIsOpen) {
   EXPECT_THAT(Listener::get().take_answers(), ElementsAre("Notify IDS_OB_MBODY_NEW_REPLY|we look at it"));
 }
 
+TEST_F(Dispatch, AReplyIsToldAndTheClientEndsAlsoWhenTheStoreCannotBeCounted) {
+  const auto run = [](const char *sql) {
+    TavroDb db;
+    sqlite3_open(TAVRO_DBMGR_FILE, tavro_out(db));
+    EXPECT_EQ(sqlite3_exec(db.get(), sql, nullptr, nullptr, nullptr), SQLITE_OK);
+  };
+  sign_in();
+  const TavroRequest reply = make_request(nullptr, {{TAVRO_SERVER_PUSH_NOTI_VOC_COMMENTS, "we look at it"}});
+  run("ALTER TABLE TABLE_VOC RENAME TO AWAY");
+  for (const auto &[known, shown] : {std::pair(3, 3u), std::pair(-1, 3u)}) {
+    tavro_initialize_application_data(&ad);
+    ad.push_noti_count = known;
+    tavro_handle_badge_notifications(reply.get(), &ad);
+    unsigned int count = 0;
+    badge_get_count(TAVRO_APP_ID, &count);
+    EXPECT_EQ(count, shown) << "only a count that is known is put on the icon";
+    EXPECT_TRUE(tavro_is_ending());
+    EXPECT_THAT(Listener::get().take_answers(), ElementsAre("Notify IDS_OB_MBODY_NEW_REPLY|we look at it"));
+  }
+  run("ALTER TABLE AWAY RENAME TO TABLE_VOC");
+}
+
 TEST_F(Dispatch, AClientStartedForAMessageEndsAndBuildsNoWindow) {
   const std::string id = std::to_string(answered_report());
   for (const auto &[key, value] :

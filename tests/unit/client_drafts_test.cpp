@@ -60,15 +60,19 @@ class Drafts : public ClientTest {
     __tavro_app_battery_capacity_changed_cb(DEVICE_CALLBACK_BATTERY_CAPACITY,
                                             reinterpret_cast<void *>(static_cast<intptr_t>(percent)), &ad);
   }
-  // Statements cannot be stored while this holds, as on a full disk.
-  void block_store(bool blocked) {
+  static void run(const std::string &sql) {
     TavroDb db;
     sqlite3_open(TAVRO_DBMGR_FILE, tavro_out(db));
-    sqlite3_exec(db.get(),
-                 blocked
-                     ? "CREATE TRIGGER full BEFORE INSERT ON TABLE_VOC BEGIN SELECT RAISE(FAIL, 'full'); END"
-                     : "DROP TRIGGER full",
-                 nullptr, nullptr, nullptr);
+    EXPECT_EQ(sqlite3_exec(db.get(), sql.c_str(), nullptr, nullptr, nullptr), SQLITE_OK) << sql;
+  }
+  // These statements fail until unblock_store, as on a full disk.
+  static void block_store(const std::string &what) {
+    run("CREATE TRIGGER \"" + what + "\" BEFORE " + what + " BEGIN SELECT RAISE(FAIL, 'full'); END");
+  }
+  static void unblock_store(const std::string &what) { run("DROP TRIGGER \"" + what + "\""); }
+  static std::ptrdiff_t media_file_count() {
+    const std::filesystem::directory_iterator files("/opt/usr/media/VantorCommunity");
+    return std::distance(begin(files), end(files));
   }
   Evas_Object *win_ = nullptr;
 };
@@ -174,7 +178,7 @@ TEST_F(Drafts, AStoreThatRefusesLeavesScreenAndDraftAndSendsNothing) {
   ad.id_to_delete = store_report("draft", 6);
   open_problem();
   Listener::get().take();
-  block_store(true);
+  block_store("INSERT ON TABLE_VOC");
   EXPECT_LT(tavro_send_compose_data(&ad), 1);
   ASSERT_NE(ad.problem_view, nullptr);
   EXPECT_STREQ(elm_entry_entry_get(ad.problem_view->title_entry), "It's loud");
@@ -182,8 +186,56 @@ TEST_F(Drafts, AStoreThatRefusesLeavesScreenAndDraftAndSendsNothing) {
   for (const std::string &line : Listener::get().take()) EXPECT_THAT(line, Not(HasSubstr("TAVRO_VOC_ID")));
   EXPECT_LT(tavro_save_problem_compose_data(&ad, TAVRO_STATUS_SENDING), 1);
   EXPECT_EQ(ad.problem_view, nullptr);
-  block_store(false);
+  EXPECT_EQ(row_count("ATTACHMENT") + row_count("TABLE_VOC_EXTENDED WHERE VOC_ID = 0"), 0);
+  unblock_store("INSERT ON TABLE_VOC");
   EXPECT_EQ(row_count("TABLE_VOC WHERE VOC_TEXT = 'draft'"), 1);
+
+  // The note of the report that was given up is not replaced by the next one's.
+  open_problem("next", "next");
+  ASSERT_GE(tavro_send_compose_data(&ad), 1);
+  EXPECT_EQ(query("group_concat(VOC_TITLE_TEXT) FROM TABLE_VOC JOIN TABLE_VOC_EXTENDED USING (VOC_ID) "
+                  "WHERE VOC_STATE = 10"),
+            "It's loud,next");
+}
+
+TEST_F(Drafts, AReportThatIsStoredInPartIsNotStoredAndIsNotDoubledByTheNextTry) {
+  for (const std::string part : {"INSERT ON TABLE_VOC_EXTENDED", "INSERT ON ATTACHMENT"}) {
+    for (const std::string removal : {"", "DELETE ON TABLE_VOC"}) {
+      SCOPED_TRACE(part + removal);
+      SetUp();
+      sign_in();
+      ad.id_to_delete = store_report("draft", 6);
+      open_problem();
+      const std::ptrdiff_t file_count = media_file_count();
+      block_store(part);
+      if (!removal.empty()) block_store(removal);
+      EXPECT_LT(tavro_send_compose_data(&ad), 1);
+      ASSERT_NE(ad.problem_view, nullptr);
+      EXPECT_EQ(row_count("TABLE_VOC"), removal.empty() ? 1 : 2);
+      EXPECT_EQ(column(ad.id_to_delete, "VOC_TEXT"), "draft");
+      EXPECT_EQ(media_file_count(), file_count);
+      EXPECT_LT(removal.empty() ? 0 : tavro_send_compose_data(&ad), 1);
+      for (const std::string &line : Listener::get().take())
+        EXPECT_THAT(line, Not(HasSubstr("TAVRO_VOC_ID")));
+
+      unblock_store(part);
+      if (!removal.empty()) unblock_store(removal);
+      const int id = tavro_send_compose_data(&ad);
+      EXPECT_EQ(column(id, "VOC_TITLE_TEXT"), "It's loud");
+      EXPECT_EQ(row_count("TABLE_VOC") * 10 + row_count("ATTACHMENT"), 11);
+    }
+  }
+}
+
+TEST_F(Drafts, ReportsSentInTheSameSecondHaveAStatusFileEach) {
+  const auto send = [this] {
+    open_problem();
+    return column(tavro_send_compose_data(&ad), "REF_3");
+  };
+  const std::string first = send(), second = send(), third = send();
+  EXPECT_NE(first, second);
+  EXPECT_NE(second, third);
+  for (const std::string &path : {first, second, third}) EXPECT_TRUE(std::filesystem::exists(path)) << path;
 }
 
 TEST_F(Drafts, ALowBatterySavesACopyAndTheScreenStaysOpen) {
@@ -216,13 +268,14 @@ TEST_F(Drafts, WhatIsOnAScreenWhenTheApplicationIsEndedBecomesADraft) {
 
 class Resend : public Drafts {
  protected:
-  // The history's send action on a stored report.
-  void send_again(int id) {
+  // The history's send action on a stored report; `meanwhile` runs after the history read it.
+  void send_again(int id, const char *meanwhile = "") {
     Evas_Object *button = elm_button_add(win_);
     evas_object_data_set(button, "app_data", &ad);
     tavro_resend_register_screen(
         {[](appdata *) { ui_calls.push_back("no file"); }, [](appdata *) { ui_calls.push_back("close"); }});
     const TavroHandle<svc_voc_data, tavro_dbmgr_free_voc_data> voc(tavro_dbmgr_get_voc_by_id(id));
+    run(meanwhile);
     tavro_send_cb(voc.get(), button, nullptr);
   }
 };
@@ -239,6 +292,15 @@ TEST_F(Resend, AFailedReportIsSendingAgainAndADraftStaysADraft) {
                                     std::to_string(id)));
     EXPECT_THAT(ui_calls, ElementsAre("close", "pop"));
   }
+}
+
+TEST_F(Resend, AReportThatReachedTheDeskMeanwhileIsLeftAsItIs) {
+  const int id = store_report("text", 11);
+  Listener::get().take();
+  send_again(id, "UPDATE TABLE_VOC SET VOC_STATE = '1#2', VOC_PUSH_READ = 0");
+  EXPECT_EQ(column(id, "VOC_STATE || '/' || VOC_PUSH_READ"), "1#2/0");
+  EXPECT_THAT(Listener::get().take(), IsEmpty());
+  EXPECT_THAT(ui_calls, ElementsAre("update history", "close", "pop"));
 }
 
 TEST_F(Resend, AReportOfAttachmentsThatAreAllGoneIsNotSent) {

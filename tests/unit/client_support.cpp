@@ -15,6 +15,7 @@
 #include "tavro_dbmgr.h"
 #include "tavro_memory.h"
 #include "tavro_notifications.h"
+#include "tavro_save_journal.h"
 #include "tavro_screens.h"
 #include "tavro_service_bridge.h"
 
@@ -180,6 +181,7 @@ void ClientTest::SetUp() {
   for (const std::string &key : keys) preference_remove(key.c_str());
   tavro_dbmgr_destroy_vocs();
   _tavro_dbmgr_clear_db("TABLE_VOC_EXTENDED");
+  tavro_journal_clear();
   Listener::get().take();
   ui_calls.clear();
 }

@@ -93,6 +93,27 @@ TEST_F(SaveJournal, SaveKilledAtAnyMomentIsWholeAfterTheNextStart) {
   EXPECT_GT(recovered, 3) << "the kills did not hit the saves";
 }
 
+TEST_F(SaveJournal, SaveThatIsUnderWayInAnotherProcessIsNotCompletedASecondTime) {
+  const pid_t pid = start_process([] {
+    const Problem whole = report();
+    if (tavro_journal_write(whole.get()) != 0) return 1;
+    std::this_thread::sleep_for(std::chrono::milliseconds(300));
+    tavro_journal_clear(tavro_dbmgr_update_bug_report(whole.get()));
+    return 0;
+  });
+  while (access(kJournal, F_OK) == -1) std::this_thread::sleep_for(std::chrono::milliseconds(1));
+  EXPECT_EQ(tavro_journal_recover(), 0);
+  EXPECT_EQ(end_of(pid), 0);
+  EXPECT_EQ(rows(), "1/3/1");
+}
+
+TEST_F(SaveJournal, NoteThatWaitsIsNotReplaced) {
+  ASSERT_EQ(tavro_journal_write(report().get()), 0);
+  EXPECT_EQ(tavro_journal_clear(-1), -1);
+  EXPECT_EQ(tavro_journal_write(problem_report("o'user", "later").get()), -1);
+  expect_whole(tavro_journal_recover());
+}
+
 TEST_F(SaveJournal, IdeaIsCompletedToo) {
   Idea idea(TAVRO_ZALLOC(tavro_dbmgr_suggestion_info));
   idea->suggestion = TAVRO_STRDUP("brighter");

@@ -1,0 +1,14 @@
+// Keys and values of the upload service's launch requests to the client. The service sends these texts: never
+// change them.
+#pragma once
+
+constexpr char TAVRO_COMM_PUSH[] = "TAVRO_COMM_PUSH";
+constexpr char TAVRO_PUSH_NUM_REPLIES[] = "TAVRO_PUSH_NUM_REPLIES";
+constexpr char TAVRO_APP_UPDATE_STATUS[] = "TAVRO_APP_UPDATE_STATUS";
+constexpr char TAVRO_SERVER_UPLOAD_STATUS[] = "TAVRO_SERVER_UPLOAD_STATUS";
+constexpr char TAVRO_SERVER_UPLOAD_SUCCESS[] = "TAVRO_SERVER_UPLOAD_SUCCESS";
+constexpr char TAVRO_SERVER_UPLOAD_FAIL[] = "TAVRO_SERVER_UPLOAD_FAIL";
+constexpr char TAVRO_SERVER_PUSH_NOTI_VOC_ID[] = "TAVRO_SERVER_PUSH_NOTI_VOC_ID";
+constexpr char TAVRO_SERVER_PUSH_NOTI_STATUS[] = "TAVRO_SERVER_PUSH_NOTI_STATUS";
+constexpr char TAVRO_SERVER_PUSH_NOTI_UPDATED[] = "TAVRO_SERVER_PUSH_NOTI_UPDATED";
+constexpr char TAVRO_SERVER_PUSH_NOTI_VOC_COMMENTS[] = "TAVRO_SERVER_PUSH_NOTI_VOC_COMMENTS";
