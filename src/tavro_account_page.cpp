@@ -66,17 +66,10 @@ void _build_account_row(account_page *view, const tavro_account_info *account) {
 void _build_name_field(account_page *view) {
   Evas_Object *margins = tavro_layout_add(view->list, "tavro/margins");
   tavro_fill_width(margins);
-  Evas_Object *field = tavro_layout_add(margins, "tavro/field");
-  view->name_entry = elm_entry_add(field);
-  elm_entry_single_line_set(view->name_entry, EINA_TRUE);
-  elm_object_style_set(view->name_entry, "tavro");
-  elm_entry_cnp_mode_set(view->name_entry, ELM_CNP_MODE_PLAINTEXT);
-  elm_object_part_text_set(view->name_entry, "elm.guide", tavro_text("IDS_OB_BODY_YOUR_NAME"));
-  elm_atspi_accessible_name_set(view->name_entry, tavro_text("IDS_OB_BODY_YOUR_NAME"));
-  elm_object_content_set(field, view->name_entry);
+  Evas_Object *field = nullptr;
+  view->name_entry = tavro_field_add(margins, tavro_text("IDS_OB_BODY_YOUR_NAME"), true, &field);
   elm_object_content_set(margins, field);
   elm_box_pack_end(view->list, margins);
-  evas_object_show(view->name_entry);
   elm_object_focus_set(view->name_entry, EINA_TRUE);
 }
 

@@ -62,6 +62,7 @@ void _target_chosen(appdata *ad, const char *name, const char *icon) {
   view->app_icon = TAVRO_STRDUP(icon);
   ad->isPerformanceApp = std::strstr(name, "Performance") != nullptr;
   _show_target(view, ad->type == IDEA);
+  elm_object_focus_set(view->title_entry, EINA_TRUE);  // what comes next
 }
 
 // ---- Ending the screen ----
@@ -186,29 +187,9 @@ void _target_clicked_cb(void *data, Evas_Object *, void *) {
 // ---- Building ----
 
 Evas_Object *_build_field(Evas_Object *box, const char *hint, bool is_single_line, int min_height_units) {
-  Evas_Object *field = tavro_layout_add(box, "tavro/field");
-  tavro_fill_width(field);
-  Evas_Object *entry = elm_entry_add(field);
-  elm_entry_single_line_set(entry, is_single_line);
-  elm_object_style_set(entry, "tavro");
-  elm_entry_cnp_mode_set(entry, ELM_CNP_MODE_PLAINTEXT);
-  elm_object_part_text_set(entry, "elm.guide", hint);
-  elm_atspi_accessible_name_set(entry, hint);
-  evas_object_smart_callback_add(
-      entry, "focused",
-      [](void *data, Evas_Object *, void *) {
-        elm_object_signal_emit(static_cast<Evas_Object *>(data), "tavro,focused", "tavro");
-      },
-      field);
-  evas_object_smart_callback_add(
-      entry, "unfocused",
-      [](void *data, Evas_Object *, void *) {
-        elm_object_signal_emit(static_cast<Evas_Object *>(data), "tavro,unfocused", "tavro");
-      },
-      field);
+  Evas_Object *field = nullptr;
+  Evas_Object *entry = tavro_field_add(box, hint, is_single_line, &field);
   evas_object_size_hint_min_set(field, 0, static_cast<int>(min_height_units * elm_config_scale_get()));
-  evas_object_show(entry);
-  elm_object_content_set(field, entry);
   elm_box_pack_end(box, field);
   return entry;
 }

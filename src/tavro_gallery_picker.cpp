@@ -1,4 +1,7 @@
 // Picker of pictures to attach: a grid of what the gallery has, any number can be chosen.
+#include <elm_atspi.h>
+
+#include <cstring>
 #include <string>
 #include <vector>
 
@@ -10,6 +13,8 @@
 #include "tavro_widgets.h"
 
 namespace {
+
+bool _is_open = false;  // a second tap opens no second picker
 
 constexpr int kColumnsUnits = 90;
 
@@ -28,6 +33,7 @@ void _show_count(gallery_picker *picker) {
   std::string text = tavro_text("IDS_OB_BUTTON_ATTACH");
   if (count > 0) text += " (" + std::to_string(count) + ")";
   elm_object_text_set(picker->add_button, text.c_str());
+  elm_atspi_accessible_name_set(picker->add_button, text.c_str());
 }
 
 char *_item_text(void *data, Evas_Object *, const char *) {
@@ -68,6 +74,7 @@ void _add_clicked_cb(void *data, Evas_Object *, void *) {
 
 void _page_deleted_cb(void *data, Evas *, Evas_Object *, void *) {
   gallery_picker *picker = static_cast<gallery_picker *>(data);
+  _is_open = false;
   elm_gengrid_item_class_free(picker->item_class);
   g_slist_free(picker->paths);
   TAVRO_FREE(picker);
@@ -101,6 +108,7 @@ Evas_Object *_build_empty(Evas_Object *page) {
   Evas_Object *empty = tavro_layout_add(page, "tavro/empty");
   elm_object_part_content_set(empty, "icon_area", tavro_tile_add(empty, "image"));
   elm_object_text_set(empty, tavro_text("IDS_OB_BODY_NO_PICTURES"));
+  elm_object_signal_emit(empty, "tavro,headed", "tavro");
   elm_object_part_text_set(empty, "elm.text.sub", tavro_text("IDS_OB_BODY_NO_PICTURES_HINT"));
   return empty;
 }
@@ -118,6 +126,8 @@ void _build_bottom(gallery_picker *picker) {
 }  // namespace
 
 void tavro_create_gallery_picker(appdata *ad, tavro_pictures_chosen chosen) {
+  if (_is_open) return;
+  _is_open = true;
   const char *title = tavro_text("IDS_OB_HEADER_CHOOSE_PICTURES");
   gallery_picker *picker = TAVRO_ZALLOC(gallery_picker);
   picker->ad = ad;

@@ -56,6 +56,8 @@ void _resend_clicked_cb(void *data, Evas_Object *button, void *event_info) {
 // ---- Building ----
 
 constexpr int kMarginUnits = 16;
+constexpr int kThumbUnits = 72;
+constexpr int kPicturesPerRow = 3;
 
 int _text_width(const Evas_Object *scroller) {
   int width = 0;
@@ -110,20 +112,33 @@ void _build_status(Evas_Object *box, const svc_voc_data *voc) {
   elm_atspi_accessible_name_set(card, (std::string(tavro_text("IDS_OB_BODY_STATUS")) + ": " + now).c_str());
 }
 
+Evas_Object *_build_picture(Evas_Object *row, const char *path) {
+  const char *slash = std::strrchr(path, '/');
+  return tavro_button_add(row, "tavro_thumb_bubble", nullptr, tavro_picture_add(row, path, kThumbUnits),
+                          slash ? slash + 1 : path, nullptr, nullptr);
+}
+
+// Rows of as many pictures as a bubble is wide.
 Evas_Object *_build_pictures(Evas_Object *parent, const svc_voc_data *voc) {
-  Evas_Object *pictures = elm_box_add(parent);
-  elm_box_horizontal_set(pictures, EINA_TRUE);
-  elm_box_align_set(pictures, 0.0, 0.5);
-  elm_box_padding_set(pictures, static_cast<int>(8 * elm_config_scale_get()), 0);
-  for (const GSList *link = voc->attachments; link; link = link->next) {
-    const char *path = static_cast<const tavro_dbmgr_attachment_info *>(link->data)->file_path;
-    const char *slash = std::strrchr(path, '/');
-    elm_box_pack_end(pictures, tavro_button_add(pictures, "tavro_thumb_bubble", nullptr,
-                                                tavro_picture_add(pictures, path, 72),
-                                                slash ? slash + 1 : path, nullptr, nullptr));
+  const int gap = static_cast<int>(8 * elm_config_scale_get());
+  Evas_Object *rows = elm_box_add(parent), *row = nullptr;
+  elm_box_align_set(rows, 0.0, 0.0);
+  elm_box_padding_set(rows, 0, gap);
+  int count = 0;
+  for (const GSList *link = voc->attachments; link; link = link->next, ++count) {
+    if (count % kPicturesPerRow == 0) {
+      row = elm_box_add(rows);
+      elm_box_horizontal_set(row, EINA_TRUE);
+      elm_box_padding_set(row, gap, 0);
+      evas_object_size_hint_align_set(row, 0.0, 0.5);
+      evas_object_show(row);
+      elm_box_pack_end(rows, row);
+    }
+    elm_box_pack_end(
+        row, _build_picture(row, static_cast<const tavro_dbmgr_attachment_info *>(link->data)->file_path));
   }
-  evas_object_show(pictures);
-  return pictures;
+  evas_object_show(rows);
+  return rows;
 }
 
 void _build_own_text(Evas_Object *box, const svc_voc_data *voc) {

@@ -122,6 +122,7 @@ Evas_Object *_build_list(category_view_win *view, Evas_Object *page) {
 }  // namespace
 
 void tavro_create_target_picker(appdata *ad, tavro_target_chosen chosen) {
+  if (ad->category_view) return;  // a second tap opens no second picker
   const char *title = tavro_text("IDS_OB_HEADER_WHAT_IS_IT_ABOUT");
   category_view_win *view = ad->category_view = TAVRO_ZALLOC(category_view_win);
   view->ad = ad;

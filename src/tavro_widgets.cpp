@@ -28,6 +28,18 @@ Evas_Object *_actions_box(Evas_Object *page) {
   return box;
 }
 
+void _field_focused_cb(void *data, Evas_Object *, void *) {
+  elm_object_signal_emit(static_cast<Evas_Object *>(data), "tavro,focused", "tavro");
+}
+
+void _field_unfocused_cb(void *data, Evas_Object *, void *) {
+  elm_object_signal_emit(static_cast<Evas_Object *>(data), "tavro,unfocused", "tavro");
+}
+
+void _field_touched_cb(void *data, Evas_Object *, const char *, const char *) {
+  elm_object_focus_set(static_cast<Evas_Object *>(data), EINA_TRUE);
+}
+
 }  // namespace
 
 std::string tavro_markup(const char *text) {
@@ -83,6 +95,24 @@ Evas_Object *tavro_button_add(Evas_Object *parent, const char *style, const char
   if (clicked) evas_object_smart_callback_add(button, "clicked", clicked, data);
   evas_object_show(button);
   return button;
+}
+
+Evas_Object *tavro_field_add(Evas_Object *parent, const char *hint, bool is_single_line,
+                             Evas_Object **field) {
+  *field = tavro_layout_add(parent, "tavro/field");
+  tavro_fill_width(*field);
+  Evas_Object *entry = elm_entry_add(*field);
+  elm_entry_single_line_set(entry, is_single_line);
+  elm_object_style_set(entry, "tavro");
+  elm_entry_cnp_mode_set(entry, ELM_CNP_MODE_PLAINTEXT);
+  elm_object_part_text_set(entry, "elm.guide", hint);
+  elm_atspi_accessible_name_set(entry, hint);
+  evas_object_smart_callback_add(entry, "focused", _field_focused_cb, *field);
+  evas_object_smart_callback_add(entry, "unfocused", _field_unfocused_cb, *field);
+  elm_layout_signal_callback_add(*field, "tavro,touched", "tavro", _field_touched_cb, entry);
+  evas_object_show(entry);
+  elm_object_content_set(*field, entry);
+  return entry;
 }
 
 Evas_Object *tavro_row_add(Evas_Object *parent, const char *tile, const char *title, const char *subtitle,
