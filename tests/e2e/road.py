@@ -53,7 +53,7 @@ class Road:
         self.screen.activate("Attach pictures")
         for name in names:
             self.screen.activate(name)
-        self.screen.activate("Attach")
+        self.screen.activate(f"Attach ({len(names)})")
         for name in names:
             self.screen.wait_for("Remove " + name)
 
