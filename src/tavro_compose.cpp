@@ -53,6 +53,15 @@ void _show_target(compose_view_win *view, bool is_idea) {
   elm_object_part_content_set(view->target_button, "elm.swallow.content", icon);
 }
 
+// Writing comes next. The naviframe gives the focus to the page's first button when the picker has gone,
+// where a blank would close the page.
+void _focus_title_cb(void *data, Evas_Object *nf, void *) {
+  const compose_view_win *view = tavro_compose_view(static_cast<appdata *>(data));
+  evas_object_smart_callback_del(nf, "transition,finished", _focus_title_cb);
+  if (view && elm_naviframe_top_item_get(nf) == view->nf_it)
+    elm_object_focus_set(view->title_entry, EINA_TRUE);
+}
+
 void _target_chosen(appdata *ad, const char *name, const char *icon) {
   compose_view_win *view = tavro_compose_view(ad);
   if (!view) return;
@@ -62,7 +71,7 @@ void _target_chosen(appdata *ad, const char *name, const char *icon) {
   view->app_icon = TAVRO_STRDUP(icon);
   ad->isPerformanceApp = std::strstr(name, "Performance") != nullptr;
   _show_target(view, ad->type == IDEA);
-  elm_object_focus_set(view->title_entry, EINA_TRUE);  // what comes next
+  evas_object_smart_callback_add(ad->nf, "transition,finished", _focus_title_cb, ad);
 }
 
 // ---- Ending the screen ----

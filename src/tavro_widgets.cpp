@@ -28,6 +28,16 @@ Evas_Object *_actions_box(Evas_Object *page) {
   return box;
 }
 
+// Filter of an entry; `markup` is malloc'ed and may be changed in place, since it only gets shorter.
+void _line_breaks_to_blanks(void *, Evas_Object *, char **markup) {
+  constexpr char kLineBreak[] = "<br/>";
+  for (char *at = *markup ? std::strstr(*markup, kLineBreak) : nullptr; at;
+       at = std::strstr(at, kLineBreak)) {
+    *at = ' ';
+    std::memmove(at + 1, at + sizeof kLineBreak - 1, std::strlen(at + sizeof kLineBreak - 1) + 1);
+  }
+}
+
 void _field_focused_cb(void *data, Evas_Object *, void *) {
   elm_object_signal_emit(static_cast<Evas_Object *>(data), "tavro,focused", "tavro");
 }
@@ -102,7 +112,8 @@ Evas_Object *tavro_field_add(Evas_Object *parent, const char *hint, bool is_sing
   *field = tavro_layout_add(parent, "tavro/field");
   tavro_fill_width(*field);
   Evas_Object *entry = elm_entry_add(*field);
-  elm_entry_single_line_set(entry, is_single_line);
+  // One line of text may still take several on a narrow screen: the box grows with it.
+  if (is_single_line) elm_entry_markup_filter_append(entry, _line_breaks_to_blanks, nullptr);
   elm_object_style_set(entry, "tavro");
   elm_entry_cnp_mode_set(entry, ELM_CNP_MODE_PLAINTEXT);
   elm_object_part_text_set(entry, "elm.guide", hint);
