@@ -53,8 +53,8 @@ void _show_target(compose_view_win *view, bool is_idea) {
   elm_object_part_content_set(view->target_button, "elm.swallow.content", icon);
 }
 
-// Writing comes next. The naviframe gives the focus to the page's first button when the picker has gone,
-// where a blank would close the page.
+// Writing comes next. The naviframe gives the focus of a page that comes up to its first button, where a
+// blank would close the page.
 void _focus_title_cb(void *data, Evas_Object *nf, void *) {
   const compose_view_win *view = tavro_compose_view(static_cast<appdata *>(data));
   evas_object_smart_callback_del(nf, "transition,finished", _focus_title_cb);
@@ -264,6 +264,7 @@ void _build_page(appdata *ad, compose_view_win *view, const svc_voc_data *draft,
   tavro_compose_strip_refresh(ad);
   view->nf_it = tavro_page_push(ad, view->layout, title);
   elm_naviframe_item_pop_cb_set(view->nf_it, _pop_cb, ad);
+  evas_object_smart_callback_add(ad->nf, "transition,finished", _focus_title_cb, ad);
   tavro_set_page_guard({_may_close, _kept_page});
   tavro_autosave_start(ad);
 }
