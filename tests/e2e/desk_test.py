@@ -12,7 +12,9 @@ import urllib.parse
 
 import pytest
 
-DESK = os.environ.get("TAVRO_DESK", "build/debug/bin/tavro-desk")
+from phone_driver import BUILD
+
+DESK = str(BUILD / "bin" / "tavro-desk")
 PNG = b"\x89PNG\r\n\x1a\n" + b"\0" * 64
 PHONE = "phone-0123456789abcdef"
 

@@ -205,8 +205,9 @@ TEST_F(Service, LosesAndDoublesNothingWhenEverythingIsKilledAtAnyMoment) {
   for (const auto &given : first["answers"]) expected += "#" + given["status"].dump();
   EXPECT_EQ(column("VOC_STATE", ids[0]), expected);
   for (int id : ids) {
-    EXPECT_EQ(desk_report(id)["attachments"].size(), 2u);
-    for (const auto &file : desk_report(id)["attachments"]) EXPECT_TRUE(file["complete"]);
+    const auto files = desk_report(id)["attachments"];
+    EXPECT_EQ(files.size(), 2u);
+    for (const auto &file : files) EXPECT_TRUE(file["complete"]);
     EXPECT_GE(count_messages("SUCCESS " + std::to_string(id)), 1);
   }
 }
