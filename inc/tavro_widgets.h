@@ -31,9 +31,9 @@ Evas_Object *tavro_picture_add(Evas_Object *parent, const char *path, int units)
 Evas_Object *tavro_button_add(Evas_Object *parent, const char *style, const char *text, Evas_Object *content,
                               const char *accessible_name, Evas_Smart_Cb clicked, const void *data);
 
-// An entry in a box with rounded corners that grows with its text (without line breaks, if it is to be one line
-// of text), which shows `hint` while it is empty; the hint is its accessible
-// name. Returns the entry, and the box through `field`. A touch anywhere on the box focuses the entry.
+// An entry in a box with rounded corners that grows with its text (without line breaks, if it is to be one
+// line of text), which shows `hint` while it is empty; the hint is its accessible name. Returns the entry,
+// and the box through `field`. A touch anywhere on the box focuses the entry.
 Evas_Object *tavro_field_add(Evas_Object *parent, const char *hint, bool is_single_line, Evas_Object **field);
 
 // A list row with a tile, a title, a second line (may be null) and something at its end (may be null).
