@@ -68,15 +68,23 @@ bool asks_for_window(const app_control_s &request) {
   return !request.operation || request.operation->compare(0, kUserOperations.size(), kUserOperations) == 0;
 }
 
+void handed_on_cb(app_control_h, app_control_h, app_control_result_e, void *) {
+  platform::release_end();
+}
+
 // The user's request met an application on its way out, which opens no window any more. The name is free by
-// now, or will be in a moment: sent anew, the request starts the application again.
+// now, or will be in a moment: sent anew, the request starts the application again. The end waits for the
+// answer, since the bus drops what it queues for a starting program when the sender goes.
 void hand_on(app_control_h request) {
   app_control_h again = nullptr;
   if (app_control_clone(&again, request) != APP_CONTROL_ERROR_NONE) return;
   app_control_set_app_id(again, platform::application_id().c_str());
-  const int error = app_control_send_launch_request(again, nullptr, nullptr);
-  if (error != APP_CONTROL_ERROR_NONE)
+  platform::hold_end();
+  const int error = app_control_send_launch_request(again, handed_on_cb, nullptr);
+  if (error != APP_CONTROL_ERROR_NONE) {
+    platform::release_end();
     dlog_print(DLOG_ERROR, "PLATFORM", "a request that met the end was not handed on: %d", error);
+  }
   app_control_destroy(again);
 }
 
