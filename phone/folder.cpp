@@ -119,7 +119,7 @@ int monitor_pid(const State &state) {
   const auto start = state.find("pid_start");
   if (pid_text == state.end() || start == state.end()) return 0;
   const int pid = static_cast<int>(g_ascii_strtoll(pid_text->second.c_str(), nullptr, 10));
-  return pid > 1 && process_start_time(pid) == start->second ? pid : 0;
+  return pid > 1 && !start->second.empty() && process_start_time(pid) == start->second ? pid : 0;
 }
 
 std::string public_lines(const State &state) {

@@ -26,8 +26,10 @@ int parent_of(int pid) {
 }
 
 std::string process_start_time(int pid) {
-  constexpr int kStartTimeField = 19;
-  return stat_field(pid, kStartTimeField);
+  constexpr int kStateField = 0, kStartTimeField = 19;
+  // A dead process that nobody has waited for yet is still listed.
+  const std::string state = stat_field(pid, kStateField);
+  return state == "Z" || state == "X" ? "" : stat_field(pid, kStartTimeField);
 }
 
 bool carries_environment(int pid, const std::string &entry) {

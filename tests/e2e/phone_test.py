@@ -116,6 +116,14 @@ def test_a_second_start_says_that_the_phone_runs_and_prints_its_values(phone):
     assert "already runs" in second.stderr
 
 
+def is_gone(pid):
+    """Whether the process has ended; a dead one that nobody has waited for yet counts."""
+    try:
+        return pathlib.Path(f"/proc/{pid}/stat").read_text().rsplit(")", 1)[1].split()[0] in "ZX"
+    except FileNotFoundError:
+        return True
+
+
 @needs_sandbox
 @pytest.mark.parametrize("is_in_place", [False, True])
 @pytest.mark.parametrize("end", ["stop", "kill"])
@@ -133,6 +141,7 @@ def test_a_start_while_the_phone_ends_waits_and_starts_anew(phone, tmp_path, end
         wait_until(lambda: "ready=" not in state_file.read_text(), what="the beginning of the end")
     else:
         os.kill(int(first["pid"]), signal.SIGKILL)
+        wait_until(lambda: is_gone(first["pid"]), what="the end of the killed process")
     text, _ = run(*start).communicate(timeout=30)
     if end == "stop":
         assert ending.wait(5) == 0
