@@ -2,7 +2,9 @@
 
 #include <gmock/gmock.h>
 
+#include <algorithm>
 #include <fstream>
+#include <random>
 #include <sstream>
 #include <string>
 #include <thread>
@@ -14,6 +16,7 @@ namespace {
 
 using ::testing::EndsWith;
 using ::testing::HasSubstr;
+using ::testing::IsEmpty;
 
 constexpr char kLog[] = "/opt/usr/share/log/platform.log";
 
@@ -74,6 +77,31 @@ TEST_F(MemoryTracker, BlockTakesTheLowestFreeSlot) {
   EXPECT_EQ(gMemDb[1].slotfree, 1);
   EXPECT_EQ(gMemDb[1].ptr, &blocks[3]);
   EXPECT_EQ(gMemDb[1].lineNo, 40);
+}
+
+TEST_F(MemoryTracker, EveryStepChangesTheSlotThatAScanWouldFind) {
+  struct expected_slot {
+    char *ptr;
+    int in_use;
+  };
+  std::vector<expected_slot> expected(kMemorySlotCount, {nullptr, 0});
+  std::vector<char> blocks(600);
+  std::minstd_rand random(1);
+  for (int step = 0; step < 30000; step++) {
+    // Few addresses at first, so that many slots hold the same one; then enough to fill the table.
+    char *block = &blocks[random() % (step < 3000 ? 40 : blocks.size())];
+    const bool inserts = random() % 3 != 0;
+    const auto found = std::find_if(expected.begin(), expected.end(), [&](const expected_slot &slot) {
+      return inserts ? !slot.in_use : slot.in_use && slot.ptr == block;
+    });
+    if (found == expected.end()) continue;
+    *found = {block, inserts ? 1 : 0};
+    (inserts ? tavro_mem_insert : tavro_mem_remove)(block, 1, "a.cpp");
+    const tavro_meminfo_s &slot = gMemDb[found - expected.begin()];
+    ASSERT_EQ(slot.ptr, found->ptr) << "step " << step;
+    ASSERT_EQ(slot.slotfree, found->in_use) << "step " << step;
+  }
+  EXPECT_THAT(new_lines(), IsEmpty());
 }
 
 TEST_F(MemoryTracker, HelpersPairEveryBlockWithItsRelease) {
