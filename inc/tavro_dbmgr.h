@@ -7,7 +7,8 @@
 // kept open between calls. Operations block while another process works on the store and are called on the
 // main loop only.
 //
-// On disk: the file below and SQLite's journal beside it, readable by the owner alone. A save is several
+// On disk: the file below, SQLite's journal and, when damage was met, empty marks beside it
+// (".tavro.db.suspect", ".tavro.db.replaced"), readable by the owner alone. A save is several
 // commits; the extension row is written last and marks the report as complete.
 //
 // Unless said otherwise operations return 0, or -1 when the file cannot be opened; a statement that fails is
@@ -125,7 +126,8 @@ int tavro_dbmgr_init_semaphore();
 // Create or open the lock without touching the state of an existing one. For the upload service. 0 or -1.
 int tavro_dbmgr_open_semaphore();
 
-// Take the lock; blocks. The kernel gives it back if the process dies. Never take it twice. 0 or -1.
+// Take the lock; blocks. The kernel gives it back if the process dies. Never take it twice. 0 or -1: then the
+// operation proceeds unlocked, and when the semaphore was removed the next wait opens it anew.
 int tavro_dbmgr_sem_wait();
 int tavro_dbmgr_sem_signal();
 
@@ -139,12 +141,13 @@ int tavro_dbmgr_db_close(sqlite3 *db);
 enum tavro_dbmgr_store_state {
   TAVRO_STORE_UNUSABLE = -1,  // logged; the store may come back (full disk, read-only)
   TAVRO_STORE_READY = 0,
-  TAVRO_STORE_REPLACED =
-      1,  // what was there was no database: kept beside it under a dated name, new one made
+  // What was there is damaged, or a database of something else: kept beside it under a dated name, new one
+  // made.
+  TAVRO_STORE_REPLACED = 1,
 };
 
 // Make folder, file, tables and indexes as far as they are missing. Harmless when two processes do it at
-// once.
+// once. Reads the whole file only after an operation met damage in it.
 tavro_dbmgr_store_state tavro_dbmgr_ensure_schema();
 
 // Whether a store was set aside, by this program or the other, and the person does not know yet.

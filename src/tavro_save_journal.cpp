@@ -12,11 +12,11 @@
 
 #include "dbmgr/tavro_dbmgr_internal.h"
 #include "tavro_log.h"
+#include "tavro_note_file.h"
 
 namespace {
 
 constexpr char kPath[] = TAVRO_DBMGR_FOLDER "/.tavro.save";
-constexpr char kUnfinishedPath[] = TAVRO_DBMGR_FOLDER "/.tavro.save.new";
 constexpr char kDamagedPath[] = TAVRO_DBMGR_FOLDER "/.tavro.save.damaged";
 constexpr char kAbandonedPath[] = TAVRO_DBMGR_FOLDER "/.tavro.save.abandoned";
 constexpr char kLockPath[] = TAVRO_DBMGR_FOLDER "/.tavro.save.lock";
@@ -29,7 +29,6 @@ constexpr char kReport[] = "report";
 constexpr char kType[] = "type";
 constexpr char kSubmitted[] = "submitted";
 constexpr char kLastVocId[] = "last_voc_id";
-constexpr char kAttachmentCount[] = "attachments";
 
 template <typename Report>
 struct journal_text {
@@ -110,79 +109,6 @@ struct report_deleter {
   void operator()(idea *report) const { tavro_dbmgr_free_suggestion_data(report); }
 };
 
-// Values are put in quotes and escaped here: GKeyFile's own texts must be UTF-8, which paths need not be.
-void _set_text(GKeyFile *file, const char *group, const char *key, const char *text) {
-  static const std::string bytes_above_ascii = [] {
-    std::string bytes;
-    for (int byte = 0x80; byte <= 0xff; byte++) bytes += static_cast<char>(byte);
-    return bytes;
-  }();
-  if (!text) return;
-  const TavroGText escaped(g_strescape(text, bytes_above_ascii.c_str()));
-  g_key_file_set_value(file, group, key, (std::string("\"") + escaped.get() + "\"").c_str());
-}
-
-char *_get_text(GKeyFile *file, const char *group, const char *key) {
-  const TavroGText value(g_key_file_get_value(file, group, key, nullptr));
-  const std::size_t length = value ? std::strlen(value.get()) : 0;
-  if (length < 2) return nullptr;
-  value.get()[length - 1] = '\0';
-  return TAVRO_ADOPT(g_strcompress(value.get() + 1));
-}
-
-std::string _attachment_group(int index) {
-  return "attachment " + std::to_string(index);
-}
-
-void _note_attachments(GKeyFile *file, const GSList *attachments) {
-  int count = 0;
-  for (; attachments; attachments = attachments->next) {
-    const auto *attachment = static_cast<const tavro_dbmgr_attachment_info *>(attachments->data);
-    if (!attachment) continue;
-    const std::string group = _attachment_group(count++);
-    _set_text(file, group.c_str(), "path", attachment->file_path);
-    _set_text(file, group.c_str(), "type", attachment->file_type);
-    g_key_file_set_double(file, group.c_str(), "size", attachment->file_size);
-  }
-  g_key_file_set_integer(file, kReport, kAttachmentCount, count);
-}
-
-GSList *_noted_attachments(GKeyFile *file) {
-  const int count = g_key_file_get_integer(file, kReport, kAttachmentCount, nullptr);
-  GSList *attachments = nullptr;
-  for (int i = 0; i < count; i++) {
-    const std::string group = _attachment_group(i);
-    if (!g_key_file_has_group(file, group.c_str())) break;
-    auto *attachment = TAVRO_ZALLOC(tavro_dbmgr_attachment_info);
-    attachment->file_path = _get_text(file, group.c_str(), "path");
-    attachment->file_type = _get_text(file, group.c_str(), "type");
-    attachment->file_size = g_key_file_get_double(file, group.c_str(), "size", nullptr);
-    attachments = g_slist_prepend(attachments, attachment);
-  }
-  return g_slist_reverse(attachments);
-}
-
-bool _write_all(int fd, const char *data, gsize size) {
-  while (size > 0) {
-    const ssize_t written = write(fd, data, size);
-    if (written == -1 && errno == EINTR) continue;
-    if (written <= 0) return false;
-    data += written;
-    size -= static_cast<gsize>(written);
-  }
-  return true;
-}
-
-bool _write_file(const char *data, gsize size) {
-  TavroUnfinishedFile unfinished(kUnfinishedPath);
-  const TavroFd fd(open(kUnfinishedPath, O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0600));
-  if (!fd || !_write_all(fd.get(), data, size) || fsync(fd.get()) == -1) return false;
-  if (rename(kUnfinishedPath, kPath) == -1) return false;
-  unfinished.keep();
-  const TavroFd folder(open(TAVRO_DBMGR_FOLDER, O_RDONLY | O_DIRECTORY | O_CLOEXEC));
-  return folder && fsync(folder.get()) == 0;
-}
-
 void _remove(const char *path) {
   if (unlink(path) == -1 && errno != ENOENT) TAVRO_LOGE("save journal stays: %s", std::strerror(errno));
 }
@@ -205,11 +131,12 @@ int _write(const Report *report) {
   g_key_file_set_string(file.get(), kReport, kType, _type(report));
   g_key_file_set_integer(file.get(), kReport, kSubmitted, report->submitted);
   g_key_file_set_integer(file.get(), kReport, kLastVocId, last_voc_id);
-  for (const auto &text : _texts(report)) _set_text(file.get(), kReport, text.key, report->*text.member);
-  _note_attachments(file.get(), report->attachments);
+  for (const auto &text : _texts(report))
+    tavro_note_set_text(file.get(), kReport, text.key, report->*text.member);
+  tavro_note_set_attachments(file.get(), kReport, report->attachments);
   gsize size = 0;
   const TavroGText data(g_key_file_to_data(file.get(), &size, nullptr));
-  if (!_write_file(data.get(), size)) {
+  if (tavro_note_write(kPath, data.get(), size) != 0) {
     const int reason = errno;
     _remove(kPath);
     return _refuse(std::strerror(reason));
@@ -223,8 +150,8 @@ std::unique_ptr<Report, report_deleter> _noted_report(GKeyFile *file) {
   std::unique_ptr<Report, report_deleter> report(TAVRO_ZALLOC(Report));
   report->submitted = g_key_file_get_integer(file, kReport, kSubmitted, nullptr);
   for (const auto &text : _texts(report.get()))
-    report.get()->*text.member = _get_text(file, kReport, text.key);
-  report->attachments = _noted_attachments(file);
+    report.get()->*text.member = tavro_note_text(file, kReport, text.key);
+  report->attachments = tavro_note_attachments(file, kReport);
   return report;
 }
 
@@ -236,8 +163,8 @@ int _noted_row(GKeyFile *file) {
   if (last_id < 0) return -1;
   if (last_id < noted_id) noted_id = 0;
   const TavroGText type(g_key_file_get_string(file, kReport, kType, nullptr));
-  const TavroText user_name(_get_text(file, kReport, "user_name"));
-  const TavroText description(_get_text(file, kReport, "description"));
+  const TavroText user_name(tavro_note_text(file, kReport, "user_name"));
+  const TavroText description(tavro_note_text(file, kReport, "description"));
   return store_find_voc_above(noted_id, type.get(), user_name.get(), description.get());
 }
 
@@ -255,6 +182,7 @@ int _complete(GKeyFile *file) {
   int id = _noted_row(file);
   if (id < 0) return -1;
   if (id == 0) {
+    _without_remains(0);  // of the noted save itself: the disk that refused it may have refused this too
     id = _without_remains(_save(report.get()));
   } else {
     if (!store_has_attachments(id, attachment_count)) store_replace_attachments(report->attachments, id);

@@ -14,8 +14,13 @@ namespace {
 constexpr std::size_t kPathBytes = 500;
 // Should two processes ever get past the lock at once, SQLite's own locks make the second wait.
 constexpr int kBusyTimeoutMilliseconds = 5000;
+// An operation that walks a large table keeps its pages until it closes, up to 2 MB of them by SQLite's own
+// measure. Once the process's SQLite memory is above this, a new page takes the place of an old one instead.
+// A save, or a report that is read, needs a quarter of it.
+constexpr sqlite3_int64 kPageMemoryBytes = 512 * 1024;
 
 int _open_connection(const char *path, TavroDb &db) {
+  sqlite3_soft_heap_limit64(kPageMemoryBytes);
   const int ret = sqlite3_open(path, tavro_out(db));
   if (ret == SQLITE_OK) sqlite3_busy_timeout(db.get(), kBusyTimeoutMilliseconds);
   return ret;
@@ -23,6 +28,18 @@ int _open_connection(const char *path, TavroDb &db) {
 
 void _log_sql_error(const char *message) {
   TAVRO_LOGD("SQL ERROR: %s  : %s", message, std::strerror(errno));
+}
+
+// The lock is held when it returns a connection, and free otherwise.
+sqlite3 *_open_under_lock(const char *db_path) {
+  char path[kPathBytes] = {};
+  g_strlcpy(path, db_path, sizeof path);
+  tavro_dbmgr_sem_wait();
+  TavroDb opened;
+  if (_open_connection(path, opened) == SQLITE_OK) return opened.release();
+  _log_sql_error(sqlite3_errmsg(opened.get()));
+  tavro_dbmgr_sem_signal();
+  return nullptr;
 }
 
 }  // namespace
@@ -41,41 +58,34 @@ TavroDb store_open(open_failure log) {
 int tavro_dbmgr_db_open(sqlite3 **db, const char *db_path) {
   TAVRO_LOGD("entry");
   *db = nullptr;
-  if (!db_path || std::strlen(db_path) >= kPathBytes) {
-    TAVRO_LOGD("%s", db_path ? "db path is too long" : "db path is NULL");
-    return -1;
+  if (!db_path) {
+    TAVRO_LOGD("db path is NULL");
+  } else if (std::strlen(db_path) >= kPathBytes) {
+    TAVRO_LOGD("db path is too long");
+  } else if ((*db = _open_under_lock(db_path))) {
+    TAVRO_LOGD("db handle is: %x", static_cast<unsigned>(reinterpret_cast<guintptr>(*db)));
   }
-  char path[kPathBytes] = {};
-  g_strlcpy(path, db_path, sizeof path);
-  tavro_dbmgr_sem_wait();
-  TavroDb opened;
-  if (_open_connection(path, opened) != SQLITE_OK) {
-    _log_sql_error(sqlite3_errmsg(opened.get()));
-    tavro_dbmgr_sem_signal();
-    return -1;
-  }
-  *db = opened.release();
-  TAVRO_LOGD("db handle is: %x", static_cast<unsigned>(reinterpret_cast<guintptr>(*db)));
   TAVRO_LOGD("exit");
-  return 0;
+  return *db ? 0 : -1;
 }
 
 int tavro_dbmgr_db_close(sqlite3 *db) {
   TAVRO_LOGD("entry");
-  if (!db) {
+  if (db) {
+    sqlite3_close(db);
+    tavro_dbmgr_sem_signal();
+  } else {
     TAVRO_LOGD("db handle is NULL");
-    return -1;
   }
-  sqlite3_close(db);
-  tavro_dbmgr_sem_signal();
   TAVRO_LOGD("exit");
-  return 0;
+  return db ? 0 : -1;
 }
 
 bool store_execute(sqlite3 *db, const char *sql) {
   TavroSqlText message;
   if (sqlite3_exec(db, sql, nullptr, nullptr, tavro_out(message)) == SQLITE_OK) return true;
   _log_sql_error(message ? message.get() : sqlite3_errmsg(db));
+  store_note_error(db);
   return false;
 }
 
@@ -86,14 +96,19 @@ bool store_execute_logged(sqlite3 *db, const statement_text &sql) {
 
 TavroStmt store_prepare(sqlite3 *db, const char *sql) {
   TavroStmt statement;
-  if (sqlite3_prepare_v2(db, sql, -1, tavro_out(statement), nullptr) != SQLITE_OK)
+  if (sqlite3_prepare_v2(db, sql, -1, tavro_out(statement), nullptr) != SQLITE_OK) {
     TAVRO_LOGD("prepare %s Fail %s", sql, sqlite3_errmsg(db));
+    store_note_error(db);
+  }
   return statement;
 }
 
 bool store_next_row(sqlite3_stmt *statement) {
   const int ret = sqlite3_step(statement);
-  if (ret != SQLITE_ROW && ret != SQLITE_DONE) _log_sql_error(sqlite3_errmsg(sqlite3_db_handle(statement)));
+  if (ret != SQLITE_ROW && ret != SQLITE_DONE) {
+    _log_sql_error(sqlite3_errmsg(sqlite3_db_handle(statement)));
+    store_note_error(sqlite3_db_handle(statement));
+  }
   return ret == SQLITE_ROW;
 }
 
@@ -115,6 +130,9 @@ char *store_column_text(sqlite3_stmt *statement, int column) {
 }
 
 int store_column_number(sqlite3_stmt *statement, int column) {
+  // Spares the number the way through a text.
+  if (sqlite3_column_type(statement, column) == SQLITE_INTEGER)
+    return static_cast<int>(sqlite3_column_int64(statement, column));
   const auto *text = reinterpret_cast<const char *>(sqlite3_column_text(statement, column));
   return text ? std::atoi(text) : 0;
 }
@@ -149,7 +167,7 @@ int _tavro_dbmgr_clear_db(const char *table) {
   const TavroDb db = store_open();
   if (!db) return -1;
   const TavroStmt statement = store_prepare(db.get(), sql.c_str());
-  if (statement && sqlite3_step(statement.get()) == SQLITE_DONE)
+  if (statement && !store_next_row(statement.get()) && sqlite3_errcode(db.get()) == SQLITE_DONE)
     TAVRO_LOGD("Deleted all the elements from the table %s", table);
   return 0;
 }

@@ -104,6 +104,10 @@ int store_run(const statement_text &sql);
 // First number of the first row; `otherwise` when there is no row or the statement fails.
 int store_read_number(sqlite3 *db, const char *sql, int otherwise);
 
+// After a statement failed: has the whole file checked at the next tavro_dbmgr_ensure_schema when the reason
+// was a damaged page.
+void store_note_error(sqlite3 *db);
+
 // ---- Rows ----
 
 // New tracked copy of a column; null for NULL.

@@ -86,8 +86,15 @@ int _operate(sembuf operation) {
   return ret;
 }
 
-int _report_failure(const char *format_detail) {
-  TAVRO_LOGD("Semaphore Wait failed with error %s", format_detail);
+// The set was removed, or never opened. The next wait opens it anew: doing so at once would let the signal of
+// the operation that runs unlocked now raise the new set's value to 2.
+bool is_set_gone = false;
+
+// Kept: the message says "Wait" for both operations.
+int _operate_logged(sembuf operation) {
+  if (_operate(operation) != -1) return 0;
+  is_set_gone = errno == EINVAL || errno == EIDRM;
+  TAVRO_LOGD("Semaphore Wait failed with error %s", std::strerror(errno));
   return -1;
 }
 
@@ -118,12 +125,10 @@ int tavro_dbmgr_open_semaphore() {
 }
 
 int tavro_dbmgr_sem_wait() {
-  if (_operate({0, -1, SEM_UNDO}) == -1) return _report_failure(std::strerror(errno));
-  return 0;
+  if (is_set_gone) is_set_gone = tavro_dbmgr_open_semaphore() == -1;
+  return _operate_logged({0, -1, SEM_UNDO});
 }
 
 int tavro_dbmgr_sem_signal() {
-  // The message says "Wait" here too: kept.
-  if (_operate({0, 1, SEM_UNDO | IPC_NOWAIT}) == -1) return _report_failure(std::strerror(errno));
-  return 0;
+  return _operate_logged({0, 1, SEM_UNDO | IPC_NOWAIT});
 }

@@ -1,5 +1,3 @@
-#include <map>
-
 #include "tavro_dbmgr_internal.h"
 #include "tavro_log.h"
 
@@ -38,86 +36,108 @@ constexpr store_column<tavro_dbmgr_attachment_info> kAttachmentColumns[] = {
     {"ATTACHMENT_SUGGESTION_ID", nullptr, &tavro_dbmgr_attachment_info::suggestion_id},
 };
 
-GSList *_read_attachments(sqlite3 *db, const statement_text &sql) {
+// Hands each attachment that a statement selects to `take`, which then owns it.
+template <typename Take>
+void _read_attachments(sqlite3 *db, const statement_text &sql, Take take) {
   const TavroStmt statement = store_prepare(db, sql.c_str());
-  if (!statement) return nullptr;
+  if (!statement) return;
   const store_row_reader<tavro_dbmgr_attachment_info> reader(statement.get(), kAttachmentColumns);
-  GSList *attachments = nullptr;
   while (store_next_row(statement.get())) {
     auto *attachment = TAVRO_ZALLOC(tavro_dbmgr_attachment_info);
     reader.read(attachment);
-    attachments = g_slist_prepend(attachments, attachment);
+    take(attachment);
   }
-  return g_slist_reverse(attachments);
 }
 
-// Reports by VOC_ID. What belongs to them is read by one statement for all: one for each report would make
-// the history three times as slow.
-using report_index = std::map<int, svc_voc_data *>;
+// Finds reports of a list by VOC_ID. What belongs to them is asked for in the order of the list, so a search
+// goes on where the last one ended.
+class report_finder {
+ public:
+  explicit report_finder(GSList *reports) : reports_(reports), last_(reports) {}
+  // Null for a report that is not in the list.
+  svc_voc_data *find(int voc_id) {
+    for (GSList *start : {last_, reports_})
+      for (GSList *item = start; item; item = item->next) {
+        auto *voc = static_cast<svc_voc_data *>(item->data);
+        if (voc->id != voc_id) continue;
+        last_ = item;
+        return voc;
+      }
+    return nullptr;
+  }
 
-std::string _id_list(const report_index &reports) {
-  std::string ids;
-  for (const auto &[id, voc] : reports) ids += (ids.empty() ? "" : ", ") + std::to_string(id);
-  return ids;
-}
+ private:
+  GSList *reports_;
+  GSList *last_;
+};
 
-// Null only for a row that a damaged file shows out of place.
-svc_voc_data *_owner(const report_index &reports, int voc_id) {
-  const auto found = reports.find(voc_id);
-  return found == reports.end() ? nullptr : found->second;
-}
+// What belongs to the selected reports is read by one statement for all: one for each report would make the
+// history three times as slow, and a list of their ids takes longer to parse than to select them again. The
+// join is CROSS so that the reports stay the outer loop and their order is kept.
+constexpr char kExtensions[] = "SELECT TABLE_VOC_EXTENDED.* FROM (SELECT VOC_ID ";
+constexpr char kOfSelected[] =
+    ") AS SELECTED CROSS JOIN TABLE_VOC_EXTENDED ON TABLE_VOC_EXTENDED.VOC_ID = SELECTED.VOC_ID;";
+constexpr char kAttachments[] = "SELECT ATTACHMENT.* FROM (SELECT VOC_ID ";
+constexpr char kAttachedToSelected[] =
+    ") AS SELECTED CROSS JOIN ATTACHMENT ON ATTACHMENT_SUGGESTION_ID = SELECTED.VOC_ID;";
 
-void _add_extensions(sqlite3 *db, const report_index &reports) {
+void _add_extensions(sqlite3 *db, const statement_text &selection, GSList *reports) {
   statement_text sql;
-  sa_strcat(sql, "SELECT * FROM TABLE_VOC_EXTENDED WHERE VOC_ID IN (", _id_list(reports).c_str(),
-            ") ORDER BY ID;");
+  sa_strcat(sql, kExtensions, selection.c_str(), kOfSelected);
   const TavroStmt statement = store_prepare(db, sql.c_str());
   if (!statement) return;
   const store_row_reader<svc_voc_data> key(statement.get(), kExtensionKey);
   const store_row_reader<svc_voc_data> reader(statement.get(), kExtensionColumns);
+  report_finder owners(reports);
   while (store_next_row(statement.get())) {
     svc_voc_data row = {};
     key.read(&row);
-    svc_voc_data *voc = _owner(reports, row.id);
+    svc_voc_data *voc = owners.find(row.id);
     if (voc && !voc->title_description && !voc->syslog_file) reader.read(voc);
   }
 }
 
-void _add_attachments(sqlite3 *db, const report_index &reports) {
+void _add_attachments(sqlite3 *db, const statement_text &selection, GSList *reports) {
   statement_text sql;
-  sa_strcat(sql, "SELECT * FROM ATTACHMENT WHERE ATTACHMENT_SUGGESTION_ID IN (", _id_list(reports).c_str(),
-            ") ORDER BY ATTACHMENT_ID DESC;");
-  GSList *attachments = _read_attachments(db, sql);
-  while (attachments) {
-    auto *attachment = static_cast<tavro_dbmgr_attachment_info *>(attachments->data);
-    attachments = g_slist_delete_link(attachments, attachments);
-    svc_voc_data *voc = _owner(reports, attachment->suggestion_id);
+  sa_strcat(sql, kAttachments, selection.c_str(), kAttachedToSelected);
+  report_finder owners(reports);
+  _read_attachments(db, sql, [&owners](tavro_dbmgr_attachment_info *attachment) {
+    svc_voc_data *voc = owners.find(attachment->suggestion_id);
     if (voc)
       voc->attachments = g_slist_prepend(voc->attachments, attachment);
     else
       tavro_db_free_attachment(attachment);
+  });
+  for (GSList *item = reports; item; item = item->next) {
+    auto *voc = static_cast<svc_voc_data *>(item->data);
+    voc->attachments = g_slist_reverse(voc->attachments);
   }
 }
 
-// The reports that a statement on TABLE_VOC selects, in its order.
-GSList *_read_reports(const statement_text &sql) {
-  const store_session store;
-  if (!store) return nullptr;
-  const TavroStmt statement = store_prepare(store.db(), sql.c_str());
+GSList *_read_report_rows(sqlite3 *db, const statement_text &selection) {
+  statement_text sql;
+  const TavroStmt statement = store_prepare(db, sa_strcat(sql, "SELECT * ", selection.c_str(), ";").c_str());
   if (!statement) return nullptr;
   const store_row_reader<svc_voc_data> reader(statement.get(), kReportColumns);
   GSList *list = nullptr;
-  report_index reports;
   while (store_next_row(statement.get())) {
     auto *voc = TAVRO_ZALLOC(svc_voc_data);
     reader.read(voc);
     if (voc->dump_file && !*voc->dump_file) TAVRO_FREE(voc->dump_file);
     list = g_slist_prepend(list, voc);
-    reports[voc->id] = voc;
   }
-  _add_extensions(store.db(), reports);
-  _add_attachments(store.db(), reports);
   return g_slist_reverse(list);
+}
+
+// The reports that `selection`, from FROM on, picks from TABLE_VOC, in its order.
+GSList *_read_reports(const statement_text &selection) {
+  const store_session store;
+  if (!store) return nullptr;
+  GSList *reports = _read_report_rows(store.db(), selection);
+  if (!reports) return nullptr;
+  _add_extensions(store.db(), selection, reports);
+  _add_attachments(store.db(), selection, reports);
+  return reports;
 }
 
 // The first report of a list; the others, which a unique key does not have, are freed.
@@ -149,26 +169,30 @@ char *_read_text_of_report(const char *table, const char *column, int voc_id) {
 }  // namespace
 
 GSList *tavro_dbmgr_get_vocs_for_history(const char *user_name) {
-  statement_text sql;
-  return _read_reports(sa_strcat(sql, "SELECT * FROM TABLE_VOC WHERE VOC_USER_NAME = ", quoted(user_name),
-                                 " ORDER BY VOC_DATE_OF_UPDATION DESC LIMIT 100;"));
+  statement_text selection;
+  return _read_reports(sa_strcat(selection, "FROM TABLE_VOC WHERE VOC_USER_NAME = ", quoted(user_name),
+                                 " ORDER BY VOC_DATE_OF_UPDATION DESC LIMIT 100"));
 }
 
 svc_voc_data *tavro_dbmgr_get_voc_by_id(int voc_id) {
-  statement_text sql;
-  return _take_single(_read_reports(sa_strcat(sql, "SELECT * FROM TABLE_VOC WHERE VOC_ID = ", voc_id, ";")));
+  statement_text selection;
+  return _take_single(_read_reports(sa_strcat(selection, "FROM TABLE_VOC WHERE VOC_ID = ", voc_id)));
 }
 
 svc_voc_data *tavro_dbmgr_get_voc_by_server_id(int server_id) {
-  statement_text sql;
+  statement_text selection;
   return _take_single(
-      _read_reports(sa_strcat(sql, "SELECT * FROM TABLE_VOC WHERE VOC_ID_SERVER = ", server_id, ";")));
+      _read_reports(sa_strcat(selection, "FROM TABLE_VOC WHERE VOC_ID_SERVER = ", server_id)));
 }
 
 GSList *tavro_dbmgr_get_attachments(int voc_id, sqlite3 *db) {
   statement_text sql;
-  return _read_attachments(
-      db, sa_strcat(sql, "SELECT * FROM ATTACHMENT WHERE ATTACHMENT_SUGGESTION_ID = ", voc_id, ";"));
+  sa_strcat(sql, "SELECT * FROM ATTACHMENT WHERE ATTACHMENT_SUGGESTION_ID = ", voc_id, ";");
+  GSList *attachments = nullptr;
+  _read_attachments(db, sql, [&attachments](tavro_dbmgr_attachment_info *attachment) {
+    attachments = g_slist_prepend(attachments, attachment);
+  });
+  return g_slist_reverse(attachments);
 }
 
 GSList *tavro_dbmgr_get_vocs_to_send() {
@@ -178,7 +202,8 @@ GSList *tavro_dbmgr_get_vocs_to_send() {
   const TavroStmt statement = store_prepare(
       store.db(),
       "SELECT VOC_ID FROM TABLE_VOC WHERE (VOC_STATE IN ('10', '11') OR VOC_STATE LIKE '%#10' OR "
-      "VOC_STATE LIKE '%#11') AND VOC_ID IN (SELECT VOC_ID FROM TABLE_VOC_EXTENDED) ORDER BY VOC_ID;");
+      "VOC_STATE LIKE '%#11') AND EXISTS (SELECT 1 FROM TABLE_VOC_EXTENDED WHERE "
+      "TABLE_VOC_EXTENDED.VOC_ID = TABLE_VOC.VOC_ID) ORDER BY VOC_ID;");
   if (!statement) return nullptr;
   GSList *ids = nullptr;
   while (store_next_row(statement.get()))
@@ -187,14 +212,12 @@ GSList *tavro_dbmgr_get_vocs_to_send() {
 }
 
 int tavro_dbmgr_get_voc_count(const char *user_name) {
-  if (!user_name) {
-    TAVRO_LOGD("user name NULL");
-    return -1;
-  }
   const store_session store;
   if (!store) return -1;
   statement_text sql;
-  sa_strcat(sql, "SELECT count(*) FROM TABLE_VOC WHERE VOC_USER_NAME = ", quoted(user_name), ";");
+  // Left empty for a null name, which selects no row.
+  if (user_name)
+    sa_strcat(sql, "SELECT count(*) FROM TABLE_VOC WHERE VOC_USER_NAME = ", quoted(user_name), ";");
   const int count = store_read_number(store.db(), sql.c_str(), -1);
   TAVRO_LOGD("count: %d", count);
   return count;
@@ -218,8 +241,8 @@ int tavro_dbmgr_check_if_dump_file_is_uploaded(const char *dump_name) {
   const TavroStmt statement = store_prepare(store.db(), sql.c_str());
   if (!statement) return -1;
   // A match and no match are not told apart here: callers only ask whether the lookup ran.
-  const int ret = sqlite3_step(statement.get());
-  return ret == SQLITE_ROW || ret == SQLITE_DONE ? 1 : -1;
+  if (store_next_row(statement.get())) return 1;
+  return sqlite3_errcode(store.db()) == SQLITE_DONE ? 1 : -1;
 }
 
 char *tavro_dbmgr_get_voc_title_description_by_id(int voc_id) {

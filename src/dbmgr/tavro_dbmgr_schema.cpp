@@ -1,6 +1,7 @@
 #include <app_common.h>
 #include <fcntl.h>
 #include <sys/file.h>
+#include <sys/stat.h>
 #include <time.h>
 
 #include <cerrno>
@@ -64,6 +65,30 @@ constexpr const char *kCountTables =
     "SELECT count(*) FROM sqlite_master WHERE type = 'table' AND name IN ('ATTACHMENT', 'TABLE_VOC', "
     "'TABLE_USER_PROFILE', 'APP_CRASH', 'APP_DATA', 'TABLE_VOC_EXTENDED', 'TABLE_BETA_PROGRAM', "
     "'TABLE_BANNER', 'TABLE_NOTIFICATIONS');";
+constexpr const char *kCountAnyTables = "SELECT count(*) FROM sqlite_master WHERE type = 'table';";
+// Walks to the last page of every table, which is where rows are added, and of the history's index.
+constexpr const char *kReadTheEnds =
+    "SELECT (SELECT max(rowid) FROM ATTACHMENT), (SELECT max(rowid) FROM TABLE_VOC), "
+    "(SELECT max(rowid) FROM TABLE_USER_PROFILE), (SELECT max(rowid) FROM APP_CRASH), "
+    "(SELECT max(rowid) FROM APP_DATA), (SELECT max(rowid) FROM TABLE_VOC_EXTENDED), "
+    "(SELECT max(rowid) FROM TABLE_BETA_PROGRAM), (SELECT max(rowid) FROM TABLE_BANNER), "
+    "(SELECT max(rowid) FROM TABLE_NOTIFICATIONS), (SELECT max(VOC_USER_NAME) FROM TABLE_VOC);";
+// Every column of ours. A file with tables of these names but without one of them is another program's. Who
+// adds a column adds it to older files first.
+constexpr const char *kNameTheColumns[] = {
+    "SELECT ATTACHMENT_ID, ATTACHMENT_FILE_PATH, ATTACHMENT_FILE_SIZE, ATTACHMENT_FILE_TYPE, "
+    "ATTACHMENT_SUGGESTION_ID FROM ATTACHMENT;",
+    "SELECT VOC_ID, VOC_TYPE, VOC_TEXT, VOC_APP_NAME, VOC_APP_ICON, VOC_SEVERITY, VOC_DUMP_PATH, VOC_STATE, "
+    "VOC_PUSH_COMMENTS, VOC_PUSH_READ, VOC_FILE_NAME, VOC_USER_NAME, VOC_DATE_OF_CREATION, "
+    "VOC_DATE_OF_UPDATION, VOC_RETRY_COUNT, VOC_ID_SERVER FROM TABLE_VOC;",
+    "SELECT ID, VOC_ID, VOC_TITLE_TEXT, REF_2, REF_3 FROM TABLE_VOC_EXTENDED;",
+    "SELECT PKG_ID, APP_ID, APP_NAME, APP_ICON, APP_DOWNLOADED FROM APP_DATA;",
+    "SELECT APP_ID, APP_CRASH_REPORTED_TIME FROM APP_CRASH;",
+    "SELECT BETA_ID, BETA_USER_STATUS FROM TABLE_BETA_PROGRAM;",
+    "SELECT BANNER_ID, BANNER_SEQ_NO, BANNER_IMAGE_PATH FROM TABLE_BANNER;",
+    "SELECT NTFCTN_ID, NTFCTN_READ_STATUS FROM TABLE_NOTIFICATIONS;",
+    "SELECT USER_ID, USER_BETA_TESTER_STATUS FROM TABLE_USER_PROFILE;",
+};
 constexpr const char *kCountIndexes =
     "SELECT count(*) FROM sqlite_master WHERE type = 'index' AND name IN ('VOC_BY_USER_AND_CHANGE', "
     "'VOC_EXTENDED_BY_VOC', 'ATTACHMENT_BY_VOC');";
@@ -88,24 +113,58 @@ bool _owns_seed_banner_image() {
 bool _is_seed_banner_image_known(sqlite3 *db) {
   if (!_owns_seed_banner_image()) return true;
   const TavroText stored(_tavro_dbmgr_get_col_data(db, "TABLE_BANNER", "BANNER_IMAGE_PATH", kSeedBannerRow));
-  return stored && _seed_banner_image() == stored.get();
+  // Without a row the place was taken over by a banner of the server's, which brings its own image.
+  return !stored || _seed_banner_image() == stored.get();
 }
 
-enum class contents { complete, incomplete, empty, not_a_database, unreadable };
+// Made by an operation that met a damaged page. Only then is the whole file read at the next start.
+constexpr char kSuspectMark[] = TAVRO_DBMGR_FOLDER "/.tavro.db.suspect";
+
+enum class contents { complete, incomplete, empty, no_store, unreadable };
+
+// Neither ours nor repairable, or just not readable now (locked, no permission)?
+contents _after_error(sqlite3 *db) {
+  const int error = sqlite3_errcode(db);
+  return error == SQLITE_NOTADB || error == SQLITE_CORRUPT ? contents::no_store : contents::unreadable;
+}
+
+// False only for damage: a check that cannot run now says nothing.
+bool _passes(sqlite3 *db, const char *check, TavroText *finding = nullptr) {
+  const TavroStmt statement = store_prepare(db, check);
+  if (!statement || !store_next_row(statement.get())) return _after_error(db) != contents::no_store;
+  if (finding) finding->reset(store_column_text(statement.get(), 0));
+  return true;
+}
+
+bool _has_our_columns(sqlite3 *db) {
+  for (const char *sql : kNameTheColumns)
+    if (!store_prepare(db, sql) && sqlite3_errcode(db) == SQLITE_ERROR) return false;
+  return true;
+}
+
+bool _passes_whole_check(sqlite3 *db) {
+  TavroText finding;
+  if (!_passes(db, "PRAGMA quick_check(1);", &finding)) return false;
+  if (!finding) return true;
+  if (std::strcmp(finding.get(), "ok") != 0) return false;
+  unlink(kSuspectMark);
+  return true;
+}
 
 contents _inspect() {
+  struct stat file = {};
+  if (stat(TAVRO_DBMGR_FILE, &file) == 0 && !S_ISREG(file.st_mode)) return contents::no_store;
   const TavroDb db = store_open();
   if (!db) return contents::unreadable;
   const int table_count = store_read_number(db.get(), kCountTables, -1);
-  if (table_count < 0) {
-    const int error = sqlite3_errcode(db.get());
-    return error == SQLITE_NOTADB || error == SQLITE_CORRUPT ? contents::not_a_database
-                                                             : contents::unreadable;
-  }
-  if (table_count == 0) return contents::empty;
-  const bool is_complete = table_count == kTableCount &&
-                           store_read_number(db.get(), kCountIndexes, 0) == kIndexCount &&
-                           _is_seed_banner_image_known(db.get());
+  if (table_count < 0) return _after_error(db.get());
+  if (table_count == 0)
+    return store_read_number(db.get(), kCountAnyTables, 0) == 0 ? contents::empty : contents::no_store;
+  if (access(kSuspectMark, F_OK) == 0 && !_passes_whole_check(db.get())) return contents::no_store;
+  if (table_count < kTableCount) return contents::incomplete;
+  if (!_has_our_columns(db.get()) || !_passes(db.get(), kReadTheEnds)) return contents::no_store;
+  const bool is_complete =
+      store_read_number(db.get(), kCountIndexes, 0) == kIndexCount && _is_seed_banner_image_known(db.get());
   return is_complete ? contents::complete : contents::incomplete;
 }
 
@@ -155,7 +214,8 @@ bool _set_aside() {
     TAVRO_LOGE("damaged store could not be set aside: %s", std::strerror(errno));
     return false;
   }
-  TAVRO_LOGE("store is no database, kept as %s", name.c_str());
+  TAVRO_LOGE("store is damaged or not ours, kept as %s", name.c_str());
+  unlink(kSuspectMark);
   const TavroFd mark(open(kReplacedMark, O_WRONLY | O_CREAT | O_CLOEXEC, 0600));
   return true;
 }
@@ -176,13 +236,18 @@ bool _create_schema(contents found) {
 tavro_dbmgr_store_state _mend(contents found) {
   if (found == contents::complete) return TAVRO_STORE_READY;
   if (found == contents::unreadable) return TAVRO_STORE_UNUSABLE;
-  const bool is_replaced = found == contents::not_a_database;
+  const bool is_replaced = found == contents::no_store;
   if (is_replaced && !_set_aside()) return TAVRO_STORE_UNUSABLE;
   if (!_create_schema(found)) return TAVRO_STORE_UNUSABLE;
   return is_replaced ? TAVRO_STORE_REPLACED : TAVRO_STORE_READY;
 }
 
 }  // namespace
+
+void store_note_error(sqlite3 *db) {
+  if (_after_error(db) != contents::no_store) return;
+  const TavroFd mark(open(kSuspectMark, O_WRONLY | O_CREAT | O_CLOEXEC, 0600));
+}
 
 bool tavro_dbmgr_is_replacement_untold() {
   return access(kReplacedMark, F_OK) == 0;

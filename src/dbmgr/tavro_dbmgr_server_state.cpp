@@ -36,10 +36,15 @@ std::string _extended_states(sqlite3 *db, const statement_text &where, const cha
   return _logged("VOC_STATE", (existing.empty() ? "" : existing + "#") + (status ? status : ""));
 }
 
+// The one character that the toolkit's markup spells with a "#" (as "&#xfffc;").
+constexpr char kObjectReplacement[] = "\xef\xbf\xbc";
+
 // As the history shows it. "#" separates entries, so none may stand inside one.
 std::string _reply_as_markup(const char *comments) {
-  std::string reply = comments ? comments : kNoReply;
+  std::string reply = comments && *comments ? comments : kNoReply;
   std::replace(reply.begin(), reply.end(), '#', ' ');
+  for (std::size_t at; (at = reply.find(kObjectReplacement)) != std::string::npos;)
+    reply.replace(at, sizeof kObjectReplacement - 1, " ");
   const TavroText markup(TAVRO_ADOPT(elm_entry_utf8_to_markup(reply.c_str())));
   return markup ? markup.get() : "";
 }

@@ -16,6 +16,13 @@ class StoreReports : public StoreWorld {
     return reports;
   }
 
+  static std::string paths(const GSList *attachments) {
+    std::string joined;
+    for (; attachments; attachments = attachments->next)
+      joined += static_cast<const tavro_dbmgr_attachment_info *>(attachments->data)->file_path;
+    return joined;
+  }
+
   static std::vector<std::string> names(GSList *apps) {
     std::vector<std::string> found;
     for (GSList *item = apps; item; item = item->next)
@@ -58,14 +65,12 @@ TEST_F(StoreReports, NewReportHasItsKindStateTimesAndAttachmentsInOrder) {
   EXPECT_EQ(voc->push_comments, nullptr);
   EXPECT_STREQ(voc->date_of_creation, voc->date_of_updation);
   EXPECT_NEAR(std::stod(voc->date_of_creation), 1000.0 * static_cast<double>(time(nullptr)), 5000);
-  std::string paths;
   for (GSList *item = voc->attachments; item; item = item->next) {
     const auto *attachment = static_cast<tavro_dbmgr_attachment_info *>(item->data);
-    paths += attachment->file_path;
     EXPECT_EQ(attachment->file_size, 1234);
     EXPECT_EQ(attachment->suggestion_id, id);
   }
-  EXPECT_EQ(paths, "/b/a/c");
+  EXPECT_EQ(paths(voc->attachments), "/b/a/c");
   EXPECT_EQ(tavro_dbmgr_get_voc_by_id(id + 1), nullptr);
 }
 
@@ -78,6 +83,30 @@ TEST_F(StoreReports, HistoryHoldsTheHundredChangedLastNewestFirst) {
   ASSERT_EQ(reports.size(), 100u);
   EXPECT_STREQ(reports.front()->date_of_updation, "1600000149000#1500000000000");
   EXPECT_STREQ(reports.back()->date_of_updation, "1600000050000#1500000000000");
+}
+
+TEST_F(StoreReports, EveryReportOfTheHistoryHasItsOwnTitleAndAttachments) {
+  run("WITH RECURSIVE n(i) AS (SELECT 1 UNION ALL SELECT i + 1 FROM n WHERE i < 150) "
+      "INSERT INTO TABLE_VOC(VOC_TYPE, VOC_APP_NAME, VOC_USER_NAME, VOC_DATE_OF_UPDATION) "
+      "SELECT 't', 'a', 'user', '1600000000000' FROM n");  // changed at the same moment
+  run("INSERT INTO TABLE_VOC_EXTENDED(VOC_ID, VOC_TITLE_TEXT) SELECT VOC_ID, 'title ' || VOC_ID FROM "
+      "TABLE_VOC "
+      "WHERE VOC_ID % 3 <> 0 ORDER BY VOC_ID * 37 % 150");
+  run("INSERT INTO ATTACHMENT(ATTACHMENT_FILE_PATH, ATTACHMENT_FILE_TYPE, ATTACHMENT_SUGGESTION_ID) "
+      "SELECT '/' || kind || VOC_ID, 'jpg', VOC_ID FROM TABLE_VOC, (SELECT 'b' AS kind UNION ALL SELECT 'a') "
+      "WHERE VOC_ID % 2 = 0 ORDER BY VOC_ID * 37 % 150, kind DESC");
+  for (const char *index : {"", "DROP INDEX VOC_BY_USER_AND_CHANGE", "DROP INDEX VOC_EXTENDED_BY_VOC",
+                            "DROP INDEX ATTACHMENT_BY_VOC"}) {
+    SCOPED_TRACE(index);
+    run(index);
+    const auto reports = history("user");
+    ASSERT_EQ(reports.size(), 100u);
+    for (const Voc &voc : reports) {
+      const std::string id = std::to_string(voc->id);
+      EXPECT_EQ(voc->title_description ? voc->title_description : "", voc->id % 3 ? "title " + id : "");
+      EXPECT_EQ(paths(voc->attachments), voc->id % 2 ? "" : "/b" + id + "/a" + id);
+    }
+  }
 }
 
 TEST_F(StoreReports, DeletingTakesWhatItSays) {

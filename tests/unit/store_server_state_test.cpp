@@ -22,6 +22,8 @@ TEST_F(StoreServerState, AnswersAccumulateAndMarkTheReportUnread) {
       {"4", "ticket #5 it's <b> & done", "12#2#3#4",
        "none#We look at it#none#ticket  5 it&apos;s &lt;b&gt; &amp; done"},
       {nullptr, "x", "12#2#3#4#", "none#We look at it#none#ticket  5 it&apos;s &lt;b&gt; &amp; done#x"},
+      {"4", "a\xef\xbf\xbc" "b", "12#2#3#4##4",
+       "none#We look at it#none#ticket  5 it&apos;s &lt;b&gt; &amp; done#x#a b"},
   };
   const int id = save_problem("user", "text");
   EXPECT_EQ(tavro_dbmgr_get_unread_push_notification_count("user"), 0);
@@ -35,7 +37,7 @@ TEST_F(StoreServerState, AnswersAccumulateAndMarkTheReportUnread) {
     tavro_dbmgr_update_read_push_notifications(id, 1);
     EXPECT_EQ(tavro_dbmgr_get_unread_push_notification_count(nullptr), 0);
   }
-  EXPECT_THAT(column("VOC_DATE_OF_UPDATION", id), MatchesRegex("([0-9]+000#){4}" + sent));
+  EXPECT_THAT(column("VOC_DATE_OF_UPDATION", id), MatchesRegex("([0-9]+000#){5}" + sent));
 }
 
 TEST_F(StoreServerState, AnswerForAnotherServerIdChangesNothing) {

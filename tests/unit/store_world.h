@@ -4,6 +4,8 @@
 #include <gmock/gmock.h>
 #include <signal.h>
 #include <sqlite3.h>
+#include <sys/prctl.h>
+#include <sys/sem.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
 #include <unistd.h>
@@ -20,13 +22,31 @@
 #include "tavro_memory.h"
 #include "tavro_type.h"
 
-// Runs `work` in a process of its own; the result is its exit status.
+// Runs `work` in a process of its own, which ends with the test; the result is its exit status.
 inline pid_t start_process(const std::function<int()> &work) {
   const pid_t pid = fork();
-  if (pid == 0) _exit(work());
+  if (pid != 0) return pid;
+  prctl(PR_SET_PDEATHSIG, SIGKILL);
+  _exit(work());
+}
+
+// The same, and comes back when `prepare` is done there; then the process waits to be killed.
+inline pid_t start_process_that_stays(const std::function<void()> &prepare) {
+  int ready[2];
+  EXPECT_EQ(pipe(ready), 0);
+  const pid_t pid = start_process([&] {
+    prepare();
+    if (write(ready[1], "x", 1) == 1) pause();
+    return 0;
+  });
+  close(ready[1]);
+  char byte;
+  EXPECT_EQ(read(ready[0], &byte, 1), 1);
+  close(ready[0]);
   return pid;
 }
 
+// The exit status, -1 for a process that was killed.
 inline int end_of(pid_t pid) {
   int status = 0;
   waitpid(pid, &status, 0);
@@ -64,6 +84,12 @@ class StoreWorld : public ::testing::Test {
     TavroDb db;
     sqlite3_open(TAVRO_DBMGR_FILE, tavro_out(db));
     EXPECT_EQ(sqlite3_exec(db.get(), sql.c_str(), nullptr, nullptr, nullptr), SQLITE_OK) << sql;
+  }
+
+  static int lock_value() { return semctl(dbmgr_semid, 0, GETVAL); }
+  static std::string log() {
+    const std::string path = "/opt/usr/share/log/platform.log";
+    return file_contents(path + ".1") + file_contents(path);
   }
 
   static std::string taken(char *text) {
