@@ -1,71 +1,23 @@
 // The local store beside plain SQLite doing the same work: saving a report with three attachments, and
 // loading the history from a store with 100, 10,000 and 100,000 reports. Runs in a phone of its own.
 #include <benchmark/benchmark.h>
-#include <unistd.h>
 
-#include <cstdlib>
 #include <cstring>
-#include <filesystem>
-#include <map>
 #include <string>
+#include <vector>
 
-#include "tavro_dbmgr.h"
-#include "tavro_handles.h"
+#include "store_sizes.h"
 #include "tavro_memory.h"
 
 namespace {
 
 namespace fs = std::filesystem;
 
-constexpr char kUser[] = "bench@example.org";
-
-std::string _description() {
-  std::string text = "It's slow. ";
-  while (text.size() < 600) text += "The list takes long to open after an update; ";
-  return text;
-}
-
-// ---- Stores of a size, made once each; the store's file is a link to the one in use ----
-
-std::string _stored_reports(int count) {
-  return "WITH RECURSIVE n(i) AS (SELECT 1 UNION ALL SELECT i + 1 FROM n WHERE i < " + std::to_string(count) +
-         ") ";
-}
-
-void _make_store(const std::string &path, int count) {
-  fs::remove_all(TAVRO_DBMGR_FOLDER);
-  if (tavro_dbmgr_ensure_schema() != TAVRO_STORE_READY) std::abort();
-  TavroDb db;
-  sqlite3_open(TAVRO_DBMGR_FILE, tavro_out(db));
-  const std::string text = _description();
-  const std::string sql =
-      "BEGIN;" + _stored_reports(count) +
-      "INSERT INTO TABLE_VOC(VOC_TYPE, VOC_TEXT, VOC_APP_NAME, VOC_APP_ICON, VOC_SEVERITY, VOC_DUMP_PATH, "
-      "VOC_STATE, VOC_PUSH_COMMENTS, VOC_PUSH_READ, VOC_FILE_NAME, VOC_USER_NAME, VOC_DATE_OF_CREATION, "
-      "VOC_DATE_OF_UPDATION, VOC_RETRY_COUNT, VOC_ID_SERVER) SELECT 'TAVRO_DBMGR_BUG_REPORT', '" +
-      text.substr(10) +
-      "', 'Gallery', '/opt/icon.png', 'High', '', '12#1#2', 'none#We look at it', 1, '', '" + kUser +
-      "', 1600000000000 + i, 1600000000000 + i, 0, i FROM n;" + _stored_reports(count) +
-      "INSERT INTO TABLE_VOC_EXTENDED(VOC_ID, VOC_TITLE_TEXT, REF_2, REF_3) SELECT i, 'Gallery is slow', '', "
-      "'/opt/usr/media/VantorCommunity/VantorCommunity_20260101000000.txt' FROM n;" +
-      _stored_reports(count * 3) +
-      "INSERT INTO ATTACHMENT(ATTACHMENT_FILE_PATH, ATTACHMENT_FILE_SIZE, ATTACHMENT_FILE_TYPE, "
-      "ATTACHMENT_SUGGESTION_ID) SELECT '/opt/usr/media/DCIM/picture_' || i || '.jpg', 123456, 'jpg', "
-      "(i - 1) / 3 + 1 FROM n; COMMIT;";
-  if (sqlite3_exec(db.get(), sql.c_str(), nullptr, nullptr, nullptr) != SQLITE_OK) std::abort();
-  db.reset();
-  fs::rename(TAVRO_DBMGR_FILE, path);
-}
-
+// The store's file becomes a link to the store with this many reports.
 void _use_store(int count) {
-  static std::map<int, std::string> stores;
-  std::string &path = stores[count];
-  if (path.empty()) {
-    path = "/opt/usr/bench_store_" + std::to_string(count) + ".db";
-    _make_store(path, count);
-  }
+  const std::string &store = bench_store(count);
   fs::remove(TAVRO_DBMGR_FILE);
-  fs::create_symlink(path, TAVRO_DBMGR_FILE);
+  fs::create_symlink(store, TAVRO_DBMGR_FILE);
 }
 
 // ---- Plain SQLite ----
@@ -146,38 +98,59 @@ void _read_plain_attachments(PlainStatement &statement, svc_voc_data &voc) {
   voc.attachments = g_slist_reverse(voc.attachments);
 }
 
-int _load_history_plainly() {
-  TavroDb db;
-  sqlite3_open(TAVRO_DBMGR_FILE, tavro_out(db));
-  PlainStatement reports(db.get(),
-                         "SELECT * FROM TABLE_VOC WHERE VOC_USER_NAME = ? ORDER BY VOC_DATE_OF_UPDATION DESC "
-                         "LIMIT 100");
-  PlainStatement extension(db.get(), "SELECT VOC_TITLE_TEXT, REF_2 FROM TABLE_VOC_EXTENDED WHERE VOC_ID = ?");
-  PlainStatement attachments(db.get(), "SELECT * FROM ATTACHMENT WHERE ATTACHMENT_SUGGESTION_ID = ?");
-  std::vector<svc_voc_data> history;
-  reports.start({kUser});
-  while (sqlite3_step(reports.get()) == SQLITE_ROW) {
-    svc_voc_data &voc = history.emplace_back();
-    _read_plain_row(reports.get(), voc);
-    sqlite3_reset(extension.get());
-    sqlite3_bind_int(extension.get(), 1, voc.id);
-    if (sqlite3_step(extension.get()) == SQLITE_ROW) {
-      voc.title_description = _plain_text(extension.get(), 0);
-      voc.syslog_file = _plain_text(extension.get(), 1);
+// The history by hand: connection and statements stay open from one load to the next.
+class PlainHistory {
+ public:
+  PlainHistory()
+      : db_(_open()),
+        reports_(
+            db_.get(),
+            "SELECT * FROM TABLE_VOC WHERE VOC_USER_NAME = ? ORDER BY VOC_DATE_OF_UPDATION DESC LIMIT 100"),
+        extension_(db_.get(), "SELECT VOC_TITLE_TEXT, REF_2 FROM TABLE_VOC_EXTENDED WHERE VOC_ID = ?"),
+        attachments_(db_.get(), "SELECT * FROM ATTACHMENT WHERE ATTACHMENT_SUGGESTION_ID = ?") {}
+
+  int load() {
+    std::vector<svc_voc_data> history;
+    reports_.start({kBenchUser});
+    while (sqlite3_step(reports_.get()) == SQLITE_ROW) {
+      svc_voc_data &voc = history.emplace_back();
+      _read_plain_row(reports_.get(), voc);
+      _read_extension(voc);
+      _read_plain_attachments(attachments_, voc);
     }
-    _read_plain_attachments(attachments, voc);
+    for (PlainStatement *statement : {&reports_, &extension_, &attachments_}) sqlite3_reset(statement->get());
+    for (svc_voc_data &voc : history) _free_plain(voc);
+    return static_cast<int>(history.size());
   }
-  for (svc_voc_data &voc : history) _free_plain(voc);
-  return static_cast<int>(history.size());
-}
+
+ private:
+  static TavroDb _open() {
+    TavroDb db;
+    if (sqlite3_open(TAVRO_DBMGR_FILE, tavro_out(db)) != SQLITE_OK) std::abort();
+    return db;
+  }
+
+  void _read_extension(svc_voc_data &voc) {
+    sqlite3_reset(extension_.get());
+    sqlite3_bind_int(extension_.get(), 1, voc.id);
+    if (sqlite3_step(extension_.get()) != SQLITE_ROW) return;
+    voc.title_description = _plain_text(extension_.get(), 0);
+    voc.syslog_file = _plain_text(extension_.get(), 1);
+  }
+
+  TavroDb db_;
+  PlainStatement reports_;
+  PlainStatement extension_;
+  PlainStatement attachments_;
+};
 
 // ---- Saving ----
 
 void SaveReport_Store(benchmark::State &state) {
   _use_store(100);
   tavro_dbmgr_bug_report_info report = {};
-  const TavroText description(TAVRO_STRDUP(_description().c_str()));
-  const TavroText user(TAVRO_STRDUP(kUser));
+  const TavroText description(TAVRO_STRDUP(bench_description().c_str()));
+  const TavroText user(TAVRO_STRDUP(kBenchUser));
   char title[] = "Gallery is slow", app[] = "Gallery", path[] = "/opt/usr/media/DCIM/picture.jpg",
        type[] = "jpg";
   tavro_dbmgr_attachment_info attachment = {0, path, 123456, type, 0};
@@ -207,10 +180,10 @@ void SaveReport_PlainSqlite(benchmark::State &state) {
   PlainStatement attachment(db.get(),
                             "INSERT INTO ATTACHMENT(ATTACHMENT_FILE_PATH, ATTACHMENT_FILE_SIZE, "
                             "ATTACHMENT_FILE_TYPE, ATTACHMENT_SUGGESTION_ID) VALUES(?, ?, ?, ?)");
-  const std::string description = _description();
+  const std::string description = bench_description();
   const std::string now = std::to_string(time(nullptr)) + "000";
   for (auto _ : state) {
-    report.run({"TAVRO_DBMGR_BUG_REPORT", description.c_str(), "Gallery", "", "", "", "10", "", kUser,
+    report.run({"TAVRO_DBMGR_BUG_REPORT", description.c_str(), "Gallery", "", "", "", "10", "", kBenchUser,
                 now.c_str(), now.c_str(), "0"});
     const std::string id = std::to_string(sqlite3_last_insert_rowid(db.get()));
     for (int i = 0; i < 3; i++)
@@ -224,7 +197,7 @@ void SaveReport_PlainSqlite(benchmark::State &state) {
 void LoadHistory_Store(benchmark::State &state) {
   _use_store(static_cast<int>(state.range(0)));
   for (auto _ : state) {
-    GSList *history = tavro_dbmgr_get_vocs_for_history(kUser);
+    GSList *history = tavro_dbmgr_get_vocs_for_history(kBenchUser);
     if (g_slist_length(history) != 100) state.SkipWithError("not all loaded");
     g_slist_free_full(history,
                       [](gpointer voc) { tavro_dbmgr_free_voc_data(static_cast<svc_voc_data *>(voc)); });
@@ -233,8 +206,9 @@ void LoadHistory_Store(benchmark::State &state) {
 
 void LoadHistory_PlainSqlite(benchmark::State &state) {
   _use_store(static_cast<int>(state.range(0)));
+  PlainHistory history;
   for (auto _ : state)
-    if (_load_history_plainly() != 100) state.SkipWithError("not all loaded");
+    if (history.load() != 100) state.SkipWithError("not all loaded");
 }
 
 BENCHMARK(SaveReport_Store)->Unit(benchmark::kMillisecond)->UseRealTime();
