@@ -42,6 +42,7 @@ typedef enum {
 #define APP_CONTROL_OPERATION_MULTI_SHARE "http://tizen.org/appcontrol/operation/multi_share"
 #define APP_CONTROL_DATA_PATH "http://tizen.org/appcontrol/data/path"
 #define APP_CONTROL_DATA_SELECTED "http://tizen.org/appcontrol/data/selected"
+#define APP_CONTROL_DATA_TEXT "http://tizen.org/appcontrol/data/text"
 
 /* Return false to stop the walk. */
 typedef bool (*app_control_extra_data_cb)(app_control_h app_control, const char *key, void *user_data);
@@ -69,13 +70,23 @@ int app_control_get_app_id(app_control_h app_control, char **app_id);
 int app_control_add_extra_data(app_control_h app_control, const char *key, const char *value);
 int app_control_remove_extra_data(app_control_h app_control, const char *key);
 int app_control_get_extra_data(app_control_h app_control, const char *key, char **value);
+/* Called once for each key. */
 int app_control_foreach_extra_data(app_control_h app_control, app_control_extra_data_cb callback,
                                    void *user_data);
+
+/* Several values under one key, in order. On the bus each is a pair of its own under the repeated key, so an
+ * array of a single value arrives as a plain one. The getter for the other kind of value fails with
+ * INVALID_DATA_TYPE. Each text of the array that is got, and the array itself, are freed with free(). */
+int app_control_add_extra_data_array(app_control_h app_control, const char *key, const char *value[],
+                                     int length);
+int app_control_get_extra_data_array(app_control_h app_control, const char *key, char ***value, int *length);
+int app_control_is_extra_data_array(app_control_h app_control, const char *key, bool *array);
 
 /* Hand the request to the application that its app id names; the phone starts it if need be. The request is
  * copied: the handle may be destroyed right after. With a callback, that is called once, whatever happens and
  * however long it takes; without one, nothing comes back, but an unknown application is still an error here.
- */
+ * A view request without an application goes to the one that the machine has for the uri's type; it takes no
+ * callback. */
 int app_control_send_launch_request(app_control_h app_control, app_control_reply_cb callback,
                                     void *user_data);
 

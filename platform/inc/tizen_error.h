@@ -35,6 +35,7 @@ enum {
 #define TIZEN_ERROR_PACKAGE_MANAGER -0x01150000
 #define TIZEN_ERROR_STORAGE -0x01160000
 #define TIZEN_ERROR_DEVICE -0x02400000
+#define TIZEN_ERROR_IMAGE_UTIL -0x02550000
 #define TIZEN_ERROR_TELEPHONY -0x02600000
 
 /* The text of a code of any interface; never null, not to be freed. */

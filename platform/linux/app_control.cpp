@@ -1,7 +1,9 @@
 #include "app_control_internal.h"
 
 #include <algorithm>
+#include <cstdlib>
 #include <new>
+#include <set>
 
 #include "scoped.h"
 
@@ -65,9 +67,28 @@ int get_text(app_control_h app_control, Text field, char **value) {
   return text && !*value ? APP_CONTROL_ERROR_OUT_OF_MEMORY : APP_CONTROL_ERROR_NONE;
 }
 
-platform::ExtraData::iterator find_key(app_control_h app_control, const char *key) {
+bool is_valid(const char *key, const char *value) {
+  return key && *key && value && is_text(key) && is_text(value);
+}
+
+// The values under a key, in order; none when there is no such key.
+std::vector<const char *> values_of(app_control_h app_control, const char *key) {
+  std::vector<const char *> values;
+  for (const auto &pair : app_control->extra_data)
+    if (pair.first == key) values.push_back(pair.second.c_str());
+  return values;
+}
+
+// Put the values where the key's first value was, or at the end.
+void replace_values(app_control_h app_control, const std::string &key,
+                    const std::vector<std::string> &values) {
   auto &pairs = app_control->extra_data;
-  return std::find_if(pairs.begin(), pairs.end(), [key](const auto &pair) { return pair.first == key; });
+  const auto has_key = [&key](const auto &pair) { return pair.first == key; };
+  const auto place = std::find_if(pairs.begin(), pairs.end(), has_key) - pairs.begin();
+  pairs.erase(std::remove_if(pairs.begin(), pairs.end(), has_key), pairs.end());
+  platform::ExtraData added;
+  for (const std::string &value : values) added.emplace_back(key, value);
+  pairs.insert(pairs.begin() + place, added.begin(), added.end());
 }
 
 }  // namespace
@@ -123,32 +144,59 @@ int app_control_get_app_id(app_control_h app_control, char **app_id) {
 }
 
 int app_control_add_extra_data(app_control_h app_control, const char *key, const char *value) {
-  if (!app_control || !key || !*key || !value || !is_text(key) || !is_text(value)) {
+  if (!app_control || !is_valid(key, value)) return APP_CONTROL_ERROR_INVALID_PARAMETER;
+  replace_values(app_control, key, {value});
+  return APP_CONTROL_ERROR_NONE;
+}
+
+int app_control_add_extra_data_array(app_control_h app_control, const char *key, const char *value[],
+                                     int length) {
+  if (!app_control || !value || length < 1) return APP_CONTROL_ERROR_INVALID_PARAMETER;
+  if (!std::all_of(value, value + length, [key](const char *text) { return is_valid(key, text); }))
     return APP_CONTROL_ERROR_INVALID_PARAMETER;
-  }
-  const auto existing = find_key(app_control, key);
-  if (existing != app_control->extra_data.end()) {
-    existing->second = value;
-  } else {
-    app_control->extra_data.emplace_back(key, value);
-  }
+  replace_values(app_control, key, {value, value + length});
   return APP_CONTROL_ERROR_NONE;
 }
 
 int app_control_remove_extra_data(app_control_h app_control, const char *key) {
   if (!app_control || !key) return APP_CONTROL_ERROR_INVALID_PARAMETER;
-  const auto existing = find_key(app_control, key);
-  if (existing == app_control->extra_data.end()) return APP_CONTROL_ERROR_KEY_NOT_FOUND;
-  app_control->extra_data.erase(existing);
+  if (values_of(app_control, key).empty()) return APP_CONTROL_ERROR_KEY_NOT_FOUND;
+  replace_values(app_control, key, {});
   return APP_CONTROL_ERROR_NONE;
 }
 
 int app_control_get_extra_data(app_control_h app_control, const char *key, char **value) {
   if (!app_control || !key || !value) return APP_CONTROL_ERROR_INVALID_PARAMETER;
-  const auto existing = find_key(app_control, key);
-  if (existing == app_control->extra_data.end()) return APP_CONTROL_ERROR_KEY_NOT_FOUND;
-  *value = duplicate(existing->second.c_str());
+  const auto values = values_of(app_control, key);
+  if (values.empty()) return APP_CONTROL_ERROR_KEY_NOT_FOUND;
+  if (values.size() > 1) return APP_CONTROL_ERROR_INVALID_DATA_TYPE;
+  *value = duplicate(values[0]);
   return *value ? APP_CONTROL_ERROR_NONE : APP_CONTROL_ERROR_OUT_OF_MEMORY;
+}
+
+int app_control_get_extra_data_array(app_control_h app_control, const char *key, char ***value, int *length) {
+  if (!app_control || !key || !value || !length) return APP_CONTROL_ERROR_INVALID_PARAMETER;
+  const auto values = values_of(app_control, key);
+  if (values.empty()) return APP_CONTROL_ERROR_KEY_NOT_FOUND;
+  if (values.size() == 1) return APP_CONTROL_ERROR_INVALID_DATA_TYPE;
+  std::vector<platform::ScopedGText> copies;
+  for (const char *text : values) copies.emplace_back(duplicate(text));
+  *value = static_cast<char **>(std::calloc(values.size(), sizeof(char *)));
+  if (!*value || std::any_of(copies.begin(), copies.end(), [](const auto &copy) { return !copy; })) {
+    std::free(*value);
+    return APP_CONTROL_ERROR_OUT_OF_MEMORY;
+  }
+  std::transform(copies.begin(), copies.end(), *value, [](auto &copy) { return copy.release(); });
+  *length = static_cast<int>(values.size());
+  return APP_CONTROL_ERROR_NONE;
+}
+
+int app_control_is_extra_data_array(app_control_h app_control, const char *key, bool *array) {
+  if (!app_control || !key || !array) return APP_CONTROL_ERROR_INVALID_PARAMETER;
+  const auto values = values_of(app_control, key);
+  if (values.empty()) return APP_CONTROL_ERROR_KEY_NOT_FOUND;
+  *array = values.size() > 1;
+  return APP_CONTROL_ERROR_NONE;
 }
 
 int app_control_foreach_extra_data(app_control_h app_control, app_control_extra_data_cb callback,
@@ -156,8 +204,9 @@ int app_control_foreach_extra_data(app_control_h app_control, app_control_extra_
   if (!app_control || !callback) return APP_CONTROL_ERROR_INVALID_PARAMETER;
   // A copy, so that the callback may change the request.
   const platform::ExtraData pairs = app_control->extra_data;
+  std::set<std::string> done;
   for (const auto &pair : pairs) {
-    if (!callback(app_control, pair.first.c_str(), user_data)) break;
+    if (done.insert(pair.first).second && !callback(app_control, pair.first.c_str(), user_data)) break;
   }
   return APP_CONTROL_ERROR_NONE;
 }

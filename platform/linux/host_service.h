@@ -6,7 +6,8 @@
 namespace platform {
 
 // A call on a service of the machine's system bus; null when the bus, the service or the object is not there
-// (which is no fault and not logged).
+// (which is no fault and not logged). A service that let a call run into the time limit counts as absent for
+// five seconds.
 ScopedVariant call_host_service(const char *service, const char *path, const char *interface,
                                 const char *method, GVariant *arguments, const char *reply_type);
 

@@ -163,6 +163,21 @@ int send_without_reply(const app_control_s &request) {
   return APP_CONTROL_ERROR_NONE;
 }
 
+// Show what the address names in the application that the machine has for its type.
+int view_with_default_application(const app_control_s &request) {
+  const ScopedGText guessed(g_content_type_guess(request.uri->c_str(), nullptr, 0, nullptr));
+  const char *type = request.mime ? request.mime->c_str() : guessed.get();
+  const ScopedObject<GAppInfo> viewer(g_app_info_get_default_for_type(type, FALSE));
+  if (!viewer) return APP_CONTROL_ERROR_APP_NOT_FOUND;
+  ErrorSlot error;
+  std::string uri = *request.uri;
+  GList uris = {uri.data(), nullptr, nullptr};
+  if (g_app_info_launch_uris(viewer.get(), &uris, nullptr, error.out())) return APP_CONTROL_ERROR_NONE;
+  dlog_print(DLOG_ERROR, "PLATFORM", "%s cannot show a %s: %s", g_app_info_get_id(viewer.get()), type,
+             error.text());
+  return APP_CONTROL_ERROR_LAUNCH_FAILED;
+}
+
 }  // namespace
 
 std::string launch_path(const std::string &app_id) {
@@ -205,6 +220,10 @@ int app_control_send_launch_request(app_control_h app_control, app_control_reply
                                     void *user_data) {
   using namespace platform;
   if (!app_control) return APP_CONTROL_ERROR_INVALID_PARAMETER;
+  if (!app_control->app_id && app_control->uri && app_control->operation == APP_CONTROL_OPERATION_VIEW &&
+      !callback) {
+    return view_with_default_application(*app_control);
+  }
   if (!app_control->app_id || !is_application_id(*app_control->app_id))
     return APP_CONTROL_ERROR_APP_NOT_FOUND;
   if (!phone_bus()) return APP_CONTROL_ERROR_LAUNCH_FAILED;

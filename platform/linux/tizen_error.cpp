@@ -7,6 +7,7 @@
 #include <app_preference.h>
 #include <badge.h>
 #include <device/device-error.h>
+#include <image_util.h>
 #include <notification.h>
 #include <package_manager_error.h>
 #include <storage.h>
@@ -51,6 +52,7 @@ constexpr ErrorText kTexts[] = {
     {STORAGE_ERROR_NOT_SUPPORTED, "Storage not supported"},
     {STORAGE_ERROR_OPERATION_FAILED, "Storage operation failed"},
     {DEVICE_ERROR_OPERATION_FAILED, "Device operation failed"},
+    {IMAGE_UTIL_ERROR_NOT_SUPPORTED_FORMAT, "Picture format not supported"},
     {TELEPHONY_ERROR_OPERATION_FAILED, "Telephony operation failed"},
     {ACCOUNT_ERROR_DUPLICATED, "Account exists already"},
     {ACCOUNT_ERROR_NO_DATA, "No account data"},

@@ -7,6 +7,8 @@
 #include <string>
 #include <vector>
 
+#include "hardware_keys.h"
+
 namespace {
 
 constexpr unsigned int kMouseBackButton = 8;  // the thumb button, as X numbers it
@@ -53,18 +55,13 @@ bool is_back_key(const std::string &key) {
   return key == "Escape" || key == "XF86Back";
 }
 
-// The desktop's toolkit pops a naviframe by itself when Escape goes down; a key that somebody asked for is
-// kept from it, or one press would go back twice.
 Eina_Bool key_down_cb(void *, int, void *event) {
-  const bool is_taken = is_back_key(static_cast<Ecore_Event_Key *>(event)->keyname) &&
-                        topmost_listener(EEXT_CALLBACK_BACK) != listeners().rend();
+  const bool is_taken = platform::take_key_down(*static_cast<Ecore_Event_Key *>(event));
   return is_taken ? ECORE_CALLBACK_DONE : ECORE_CALLBACK_PASS_ON;
 }
 
 Eina_Bool key_up_cb(void *, int, void *event) {
-  const std::string key = static_cast<Ecore_Event_Key *>(event)->keyname;
-  if (is_back_key(key)) serve_key(EEXT_CALLBACK_BACK);
-  if (key == "Menu" || key == "XF86Menu" || key == "XF86Send") serve_key(EEXT_CALLBACK_MORE);
+  platform::serve_key_up(*static_cast<Ecore_Event_Key *>(event));
   return ECORE_CALLBACK_PASS_ON;
 }
 
@@ -100,6 +97,18 @@ bool has_listener(const Evas_Object *object) {
 }
 
 }  // namespace
+
+// The desktop's toolkit pops a naviframe by itself when Escape goes down; a key that somebody asked for is
+// kept from it, or one press would go back twice.
+bool platform::take_key_down(const Ecore_Event_Key &key) {
+  return is_back_key(key.keyname) && topmost_listener(EEXT_CALLBACK_BACK) != listeners().rend();
+}
+
+void platform::serve_key_up(const Ecore_Event_Key &key) {
+  const std::string name = key.keyname;
+  if (is_back_key(name)) serve_key(EEXT_CALLBACK_BACK);
+  if (name == "Menu" || name == "XF86Menu" || name == "XF86Send") serve_key(EEXT_CALLBACK_MORE);
+}
 
 void eext_object_event_callback_add(Evas_Object *obj, Eext_Callback_Type type, Eext_Event_Cb func,
                                     void *data) {

@@ -1,9 +1,32 @@
 #define EFL_BETA_API_SUPPORT
+#define EFL_ACCESS_OBJECT_PROTECTED
 #include "elm_atspi.h"
 
 #include <efl_access_object.eo.h>
 
+namespace {
+
+constexpr Efl_Access_State_Set bit(Efl_Access_State_Type state) {
+  return Efl_Access_State_Set{1} << state;
+}
+
+// The desktop's toolkit keeps quiet about the focus of a control that has widgets inside, such as a row with
+// an icon, and a screen reader would not follow it.
+Efl_Access_State_Set states_of(Eo *control, void *) {
+  Efl_Access_State_Set states =
+      efl_access_object_state_set_get(efl_super(control, EFL_OBJECT_OVERRIDE_CLASS));
+  const bool is_container = efl_access_object_role_get(control) == EFL_ACCESS_ROLE_FILLER;
+  if (is_container || !elm_object_focus_allow_get(control)) return states;
+  if (!elm_object_disabled_get(control)) states |= bit(EFL_ACCESS_STATE_TYPE_FOCUSABLE);
+  if (elm_object_focus_get(control)) states |= bit(EFL_ACCESS_STATE_TYPE_FOCUSED);
+  return states;
+}
+
+}  // namespace
+
 void elm_atspi_accessible_name_set(Evas_Object *obj, const char *name) {
+  EFL_OPS_DEFINE(overrides, EFL_OBJECT_OP_FUNC(efl_access_object_state_set_get, states_of));
+  efl_object_override(obj, &overrides);
   efl_access_object_i18n_name_set(obj, name);
 }
 

@@ -15,6 +15,7 @@
 #include "bus.h"
 #include "first_frame.h"
 #include "main_loop.h"
+#include "screen_reader_keys.h"
 #include "system_info_source.h"
 #include "window_watch.h"
 
@@ -123,6 +124,7 @@ bool start_toolkit(int argc, char **argv) {
   platform::set_screen_size_source(screen_size);
   platform::merge_glib_into_ecore();
   platform::watch_windows(windows_changed);
+  platform::share_keys_with_screen_reader();
   return true;
 }
 
@@ -147,6 +149,7 @@ int run_application(int argc, char **argv) {
   platform::leave_application(!is_created);
   if (is_created && app.callback.terminate) app.callback.terminate(app.user_data);
   platform::finish_outgoing();
+  platform::stop_sharing_keys();
   platform::stop_watching_windows();
   platform::set_screen_size_source(nullptr);
   platform::separate_glib_from_ecore();
