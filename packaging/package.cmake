@@ -2,6 +2,8 @@
 # the phone finds its applications beside it; users see one command and one desktop entry.
 set(TAVRO_HOME lib/tavro)
 set(TAVRO_PHONE_PROGRAM ${CMAKE_INSTALL_PREFIX}/${TAVRO_HOME}/bin/tavro-phone)
+install(DIRECTORY ${CMAKE_BINARY_DIR}/apps/org.tizen.system.crash DESTINATION ${TAVRO_HOME}/apps
+        USE_SOURCE_PERMISSIONS)
 foreach(app corvane.tavro-lite corvane.tavro-svc)
   set(entry ${CMAKE_BINARY_DIR}/packaging/${app}.desktop)
   configure_file(${PROJECT_SOURCE_DIR}/packaging/${app}.desktop.in ${entry} @ONLY)

@@ -31,9 +31,10 @@ bool read_request(int argc, char **argv, std::string *dir, bool *wants_reply, La
   for (int i = 0; i < argc; ++i) {
     if (!is_text(argv[i])) return misuse("a launch request carries UTF-8 text only"), false;
   }
-  CommandLine line("APPID [KEY=VALUE …]",
-                   "Send one launch request, as any application of the phone would. With "
-                   "--reply prints result=N and the reply's KEY=VALUE lines.");
+  CommandLine line(
+      "APPID [KEY=VALUE …]",
+      "Send one launch request, as any application of the phone would. A KEY that is "
+      "repeated carries all its values. With --reply prints result=N and the reply's KEY=VALUE lines.");
   line.text("dir", dir, kDirHelp, "DIR");
   line.text("operation", &request->operation, "The request's operation", "OP");
   line.text("uri", &request->uri, "The request's address", "URI");

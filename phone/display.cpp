@@ -2,6 +2,7 @@
 
 #include <sys/random.h>
 
+#include <algorithm>
 #include <cstdio>
 #include <cstring>
 
@@ -164,8 +165,9 @@ std::vector<std::string> notification_command(const Folder &folder) {
 
 void use_virtual_display(Environment *environment, const Folder &folder, const ScreenSize &size,
                          const std::string &number) {
+  // A phone that is turned keeps its scale.
   char scale[G_ASCII_DTOSTR_BUF_SIZE];
-  g_ascii_formatd(scale, sizeof scale, "%.3f", size.width / kUnitsPerWidth);
+  g_ascii_formatd(scale, sizeof scale, "%.3f", std::min(size.width, size.height) / kUnitsPerWidth);
   environment->set("DISPLAY", ":" + number);
   environment->set("XAUTHORITY", folder.run("xauthority"));
   environment->set("ELM_SCALE", scale);

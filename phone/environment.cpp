@@ -69,6 +69,7 @@ Environment phone_environment(const Folder &folder, const std::string &socket_fo
       {"XDG_CACHE_HOME", folder.dir + "/cache"},
       {"ELM_CONFIG_DIR_XDG", "1"},
       {"ELM_DISPLAY", "x11"},
+      {"ELM_THUMBSCROLL_ENABLE", "1"},  // lists follow the finger
       {"EINA_LOG_BACKTRACE", "-1"},
   };
   for (const auto &[key, value] : phone_values) environment.set(key, value);

@@ -61,8 +61,8 @@ bool create_folder(const Folder &folder) {
 }
 
 bool create_storage(const std::string &usr) {
-  for (const char *part : {"/apps/corvane.tavro-lite/shared/data", "/apps/corvane.tavro-svc/data", "/media",
-                           "/dbspace", "/share/log"}) {
+  for (const char *part : {"/apps/corvane.tavro-lite/shared/data", "/apps/corvane.tavro-svc/data",
+                           "/media/QRT_debug", "/dbspace", "/share/log"}) {
     if (!make_private(usr + part)) return false;
   }
   return true;

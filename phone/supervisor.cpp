@@ -254,7 +254,7 @@ void Supervisor::announce_ready() {
 void Supervisor::shut_down() {
   service_keeper_.reset();
   if (bus_) {
-    for (const char *app_id : {kClientId, kServiceId}) {
+    for (const char *app_id : {kClientId, kServiceId, kCrashServiceId}) {
       end_application(bus_.get(), app_id, kApplicationPatienceMilliseconds);
     }
   }
@@ -305,8 +305,9 @@ std::string Supervisor::status_lines() const {
         program->is_running() ? "runs, pid " + std::to_string(program->pid()) : "starts again";
     text += program->name() + ": " + state + "\n";
   }
-  for (const char *app_id : {kServiceId, kClientId}) {
+  for (const char *app_id : {kServiceId, kClientId, kCrashServiceId}) {
     const int pid = bus_ ? application_pid(bus_.get(), app_id) : 0;
+    if (!pid && std::string(app_id) == kCrashServiceId) continue;
     text += std::string(app_id) + ": " + (pid ? "runs, pid " + std::to_string(pid) : "does not run") + "\n";
   }
   return text;
