@@ -4,6 +4,7 @@
 #include <Elementary.h>
 
 #include <initializer_list>
+#include <vector>
 
 struct appdata;
 
@@ -40,6 +41,10 @@ Evas_Object *tavro_popup_show(appdata *ad, Evas_Object **slot, const char *title
 // A menu below the end of the title bar; a touch beside it closes it. Otherwise as a popup.
 Evas_Object *tavro_menu_show(appdata *ad, Evas_Object **slot,
                              std::initializer_list<tavro_popup_button> entries);
+
+// The same at the foot of the window, under a title.
+Evas_Object *tavro_sheet_show(appdata *ad, Evas_Object **slot, const char *title,
+                              const std::vector<tavro_popup_button> &entries);
 
 // Close every popup that is shown.
 void tavro_delete_all_popup(appdata *ad);

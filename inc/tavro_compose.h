@@ -1,8 +1,12 @@
-// Shared by the two compose screens: which record is open, what still stands in the way of sending, and what
-// the attachments add up to. The screens themselves are opened through tavro_screens.h. Main loop only.
+// Shared by the two compose screens: which record is open, what still stands in the way of sending, which
+// files can be attached, and what they add up to. The screens themselves are opened through tavro_screens.h.
+// Main loop only; asks the disk about single files.
 #pragma once
 
 #include <glib.h>
+
+#include <string>
+#include <vector>
 
 #include "tavro_drafts.h"
 
@@ -15,17 +19,40 @@ compose_view_win *tavro_compose_view(appdata *ad);
 enum tavro_compose_gap {
   TAVRO_COMPOSE_COMPLETE = 0,
   TAVRO_COMPOSE_NO_TARGET,
-  TAVRO_COMPOSE_NO_CONTENT,  // neither title, description nor attachment
+  TAVRO_COMPOSE_NO_CONTENT,  // neither title, description, attachment nor crash dump
   TAVRO_COMPOSE_TOO_LARGE,
 };
-tavro_compose_gap tavro_compose_check(const compose_view_win *view, gint64 limit);
+tavro_compose_gap tavro_compose_check(const appdata *ad, gint64 limit);
 
-// Whether there is anything that leaving the screen would lose.
-bool tavro_compose_has_content(const compose_view_win *view);
+// Whether the open screen holds anything that tells support something by itself: text, attachment, crash
+// dump. A log alone does not. False when no screen is open.
+bool tavro_compose_has_content(const appdata *ad);
 
 // Size of a file that can be attached, in bytes; -1 when it is gone, not a plain file or not readable.
 gint64 tavro_attachment_size(const char *path);
 
+// Why a file cannot be attached. Pictures (JPEG, PNG) and videos (MP4) are told by what they hold.
+enum tavro_attachment_fault {
+  TAVRO_ATTACHMENT_GOOD = 0,
+  TAVRO_ATTACHMENT_UNREADABLE,  // gone, not a plain file, or not readable
+  TAVRO_ATTACHMENT_EMPTY,
+  TAVRO_ATTACHMENT_TOO_LARGE,  // by itself larger than the limit of a whole report
+  TAVRO_ATTACHMENT_OTHER_KIND,
+};
+tavro_attachment_fault tavro_attachment_check(const char *path);
+
 // Attach a file unless it is attached already; false when it cannot be attached. Keeps `buffer`.
 bool tavro_compose_attach(compose_view_win *view, const char *path);
 void tavro_compose_detach(compose_view_win *view, const char *path);
+// Move an attachment by `steps` places, as far as there are places.
+void tavro_compose_move(compose_view_win *view, const char *path, int steps);
+// Add `buffer` up anew: files change while they are attached.
+void tavro_compose_count(compose_view_win *view);
+// The attachments of which nothing can be sent any more: gone, unreadable or empty.
+std::vector<std::string> tavro_compose_lost_attachments(const compose_view_win *view);
+
+// The last part of a path.
+std::string tavro_file_name(const char *path);
+
+// All that would be sent, in bytes: attachments, system log and crash dump.
+gint64 tavro_compose_total(const appdata *ad);

@@ -1,13 +1,31 @@
-// The strip of attachments of a compose screen and the size shown against the limit. Main loop only.
+// The strip of attachments of a compose screen, its crash dump's row, and the size shown against the limit.
+// Main loop only.
 #pragma once
 
 #include <Elementary.h>
+#include <glib.h>
 
 struct appdata;
 struct compose_view_win;
 
 // Build an empty strip into the screen's box.
 void tavro_compose_strip_build(appdata *ad, compose_view_win *view, Evas_Object *box);
+// Build the row of the crash dump, when the screen holds one.
+void tavro_compose_dump_build(appdata *ad, Evas_Object *box);
 
-// Show the open screen's attachments and their size as they are now.
+// Show the open screen's attachments, dump and size as they are now.
 void tavro_compose_strip_refresh(appdata *ad);
+// Give the focus to an attachment's picture; to the button that attaches when there is none of this path.
+void tavro_compose_strip_focus(appdata *ad, const char *path);
+// Take an attachment off the open screen; the focus goes to what takes its place.
+void tavro_compose_strip_remove(appdata *ad, const char *path);
+// The size alone.
+void tavro_compose_size_refresh(appdata *ad);
+
+// Attach files to the open screen; those that cannot be attached are named in a popup, each with the reason.
+// `paths` is a list of const char *.
+void tavro_compose_attach_files(appdata *ad, const GSList *paths);
+
+// What can be attached, and what can be done with one attachment, as menus at the foot of the screen.
+void tavro_compose_show_sources(appdata *ad);
+void tavro_compose_show_attachment_menu(appdata *ad, const char *path);

@@ -29,18 +29,21 @@ struct compose_view_win {
 
   // The screen's other widgets; the saver does not look at them.
   Evas_Object *target_button;
-  Evas_Object *strip;   // box of the attachments' thumbnails
-  Evas_Object *bottom;  // size shown against the limit
+  Evas_Object *strip;    // box of the attachments' thumbnails
+  Evas_Object *bottom;   // size shown against the limit
+  Evas_Object *log_row;  // system log of a problem; null on the idea screen
 };
 
 // The problem report screen.
 struct problem_view_win : compose_view_win {
   Evas_Object *collectBtn;  // shown while a log can be collected
+  Evas_Object *dump_row;    // crash dump of the report; null without one
   char *dump_filename;
   char *dump_filepath;
   char *syslog_filename;
   char *syslog_filepath;
-  bool server_size_error;  // the last check found the report larger than the limit
+  bool server_size_error;         // the last check found the report larger than the limit
+  bool is_device_status_removed;  // the person took the device status off what is sent
 };
 
 // The idea screen.
@@ -64,7 +67,7 @@ int tavro_send_compose_data(appdata *ad);
 int tavro_save_compose_draft(appdata *ad);
 
 // The largest total of attachments in bytes that may be sent, from the preference
-// "TAVRO_PREF_MAX_SIZE_ATTACHMENT" (kilobytes; 30 MB when it is 0 or unset).
+// "TAVRO_PREF_MAX_SIZE_ATTACHMENT" (kilobytes; 30 MB when it is unset or not above 0, 1 GB at most).
 gint64 tavro_attachment_size_limit();
 
 // Write into `filename` the path of a new file in the client's media folder, named after the local time; the
@@ -87,3 +90,6 @@ void tavro_free_bug_report(tavro_dbmgr_bug_report_info *report);
 void tavro_free_suggestion_info(tavro_dbmgr_suggestion_info *suggestion);
 void tavro_free_problem_view(problem_view_win *view);
 void tavro_free_idea_view(idea_view_win *view);
+
+// End the open compose record, whichever it is, with its menu: free it and clear its field of appdata.
+void tavro_free_compose_view(appdata *ad);

@@ -24,7 +24,7 @@ void tavro_mem_check_init();
 // Record a block in the first free slot. With no slot left the record is dropped with a log line.
 void tavro_mem_insert(void *ptr, int line, const char *file);
 
-// Give back the slot of a block. Never reads the block itself.
+// Give back the first slot that holds a block. Never reads the block itself.
 void tavro_mem_remove(void *ptr, int line, const char *file);
 
 // Log every block that is still held, then their number.

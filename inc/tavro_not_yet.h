@@ -6,9 +6,11 @@
 #include <app_control.h>
 #include <glib.h>
 
-struct appdata;
+#include "tavro-main.h"
 
-// Capture manager and floating capture control.
+// Capture manager and floating capture control. A capture that was started attaches what it takes to the open
+// compose screen; false when it cannot start.
+bool tavro_capture_start(appdata *ad, captureType type);
 void send_cpmgr_shutdown(appdata *ad);
 void record_btn_clicked_cb(void *data, Evas_Object *obj, void *event_info);
 void tavro_cpmgr_on_get_error_cb(app_control_h service, appdata *ad);
@@ -21,10 +23,8 @@ void tavro_load_url(appdata *ad, int in_background);
 void tavro_create_account_page_ui(appdata *ad, GSList *accounts);
 int tavro_add_account_result(appdata *ad);
 
-// Crash reports and the share menu.
+// Crash reports.
 void tavro_show_crash_report(appdata *ad);
-void tavro_take_dump_log(appdata *ad);
-void tavro_attach_shared_files(appdata *ad);
 
 // Beta centre, banners and log-out.
 Evas_Object *tavro_beta_details_optin_button(appdata *ad);  // null when the details page is not shown

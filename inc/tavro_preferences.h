@@ -21,6 +21,7 @@ constexpr char TAVRO_PREF_FLASH_WINDOWS[] = "tavro_flash_windows";              
 constexpr char TAVRO_PREF_QUALITY[] = "tavro_quality";                                // int: recording
 constexpr char TAVRO_PREF_PREFERENCE[] = "tavro_preference";                          // int: first run
 constexpr char TAVRO_PREF_NEW_WELCOME_PREFERENCE[] = "tavro_new_welcome_preference";  // int
+constexpr char TAVRO_PREF_SENT_PAGE_SEEN[] = "tavro_sent_page_seen";  // boolean: "What is sent" was shown
 constexpr char TAVRO_PREF_UPDATE[] = "tavro_update";  // string: "updated" once a minor update was offered
 
 // The account; all but the maker's user name are removed at log-out.

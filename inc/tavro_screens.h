@@ -34,6 +34,17 @@ void tavro_create_target_picker(appdata *ad, tavro_target_chosen chosen);
 using tavro_pictures_chosen = void (*)(appdata *ad, const GSList *paths);
 void tavro_create_gallery_picker(appdata *ad, tavro_pictures_chosen chosen);
 
+// What will be sent: text, every file with its size, the device status as it will be written, the log, the
+// account. Each can be opened; files, log and device status can be removed, which changes the open compose
+// screen. `send` is called once when the person sends from there; null shows the page without a send button.
+using tavro_review_send = void (*)(appdata *ad);
+void tavro_create_review_page(appdata *ad, tavro_review_send send);
+
+// One picture or video of the phone, as large as the screen. One plain text, scrolled, in parts when it is
+// long; a log keeps its columns. All arguments are copied.
+void tavro_create_picture_page(appdata *ad, const char *path);
+void tavro_create_text_page(appdata *ad, const char *title, const char *text, bool is_log = false);
+
 // History list "My Reports", and its refresh after a message of the upload service (does nothing when the
 // page is not open). The request may be null.
 void tavro_create_history_page(appdata *ad);

@@ -61,3 +61,6 @@ Elm_Object_Item *tavro_page_push(appdata *ad, Evas_Object *page, const char *tit
 
 // "3.4" for 3,400,000 bytes: megabytes with one decimal.
 std::string tavro_megabytes(long long bytes);
+
+// "184 kB" or "1.2 MB", in the person's language; what holds anything is at least 1 kB.
+std::string tavro_size_text(long long bytes);

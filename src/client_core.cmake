@@ -4,6 +4,8 @@ set(TAVRO_CLIENT_CORE
   tavro_appcontrol_util.cpp
   tavro_appdata.cpp
   tavro_autosave.cpp
+  tavro_compose_keeper.cpp
+  tavro_compose_kept.cpp
   tavro_crash_service.cpp
   tavro_device_status.cpp
   tavro_drafts.cpp
@@ -11,6 +13,7 @@ set(TAVRO_CLIENT_CORE
   tavro_drafts_records.cpp
   tavro_history_text.cpp
   tavro_lifecycle.cpp
+  tavro_log_archive.cpp
   tavro_not_yet.cpp
   tavro_notifications.cpp
   tavro_preferences.cpp
@@ -23,4 +26,5 @@ set(TAVRO_CLIENT_CORE
   tavro_service_bridge.cpp
   tavro_service_events.cpp
   tavro_start.cpp
+  tavro_system_log.cpp
   tavro_version_check.cpp)

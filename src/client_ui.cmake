@@ -2,18 +2,38 @@
 set(TAVRO_CLIENT_UI
   tavro_theme.cpp
   tavro_locale.cpp
+  tavro_focus.cpp
   tavro_widgets.cpp
   tavro-common.cpp
   tavro_popup.cpp
   tavro_targets.cpp
+  tavro_performance_page.cpp
+  tavro_target_rows.cpp
+  tavro_thumbnail_maker.cpp
+  tavro_thumbnail_cache.cpp
+  tavro_picture_info.cpp
+  tavro_app_list_store.cpp
+  tavro_app_list.cpp
   tavro_gallery.cpp
+  tavro_thumbnails.cpp
   tavro_details_text.cpp
+  tavro_compose_attach.cpp
+  tavro_compose_end.cpp
+  tavro_compose_log.cpp
+  tavro_compose_send.cpp
   tavro_compose_state.cpp
   tavro_compose_strip.cpp
   tavro_compose.cpp
+  tavro_compose_offer.cpp
+  tavro_review_items.cpp
+  tavro_review_page.cpp
+  tavro_text_page.cpp
+  tavro_text_parts.cpp
+  tavro_viewer.cpp
   tavro_target_picker.cpp
   tavro_gallery_picker.cpp
   tavro_landing.cpp
   tavro_account_page.cpp
   tavro_history.cpp
-  tavro_history_details.cpp)
+  tavro_history_details.cpp
+  tavro_share.cpp)

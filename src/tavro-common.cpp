@@ -9,6 +9,7 @@
 #include <string>
 
 #include "tavro-main.h"
+#include "tavro_focus.h"
 #include "tavro_log.h"
 #include "tavro_theme.h"
 #include "tavro_widgets.h"
@@ -37,6 +38,7 @@ Evas_Object *_build_window(appdata *ad) {
   elm_win_title_set(win, "Vantor Community");
   evas_object_smart_callback_add(win, "delete,request", _close_requested_cb, ad);
   evas_object_event_callback_add(win, EVAS_CALLBACK_DEL, _win_deleted_cb, ad);
+  tavro_focus_hide_at_touch(win);
   const double scale = elm_config_scale_get();
   evas_object_resize(win, static_cast<int>(kWindowWidthUnits * scale),
                      static_cast<int>(kWindowHeightUnits * scale));
@@ -70,6 +72,7 @@ bool tavro_create_base_window(appdata *ad) {
   elm_object_content_set(ad->conform, ad->layout);
   ad->nf = elm_naviframe_add(ad->layout);
   elm_naviframe_prev_btn_auto_pushed_set(ad->nf, EINA_FALSE);
+  tavro_focus_follow_pages(ad->nf);
   eext_object_event_callback_add(ad->nf, EEXT_CALLBACK_BACK, _back_key_cb, ad);
   evas_object_show(ad->nf);
   elm_object_content_set(ad->layout, ad->nf);

@@ -14,6 +14,7 @@
 #include "tavro_memory.h"
 #include "tavro_preferences.h"
 #include "tavro_screens.h"
+#include "tavro_share.h"
 #include "tavro_widgets.h"
 
 namespace {
@@ -54,13 +55,14 @@ void _row_clicked_cb(void *data, Evas_Object *row, void *) {
   if (!view->rebuild) view->rebuild = ecore_job_add(_rebuild_job, view);
 }
 
-void _build_account_row(account_page *view, const tavro_account_info *account) {
+Evas_Object *_build_account_row(account_page *view, const tavro_account_info *account) {
   const char *second = account->email && *account->email ? account->email : account->user_name;
   Evas_Object *mark = view->chosen == account ? tavro_icon_add(view->list, "check/accent") : nullptr;
   Evas_Object *row =
       tavro_row_add(view->list, "person", _shown_name(account), second, mark, _row_clicked_cb, view);
   evas_object_data_set(row, "account", account);
   elm_box_pack_end(view->list, row);
+  return row;
 }
 
 void _build_name_field(account_page *view) {
@@ -74,10 +76,14 @@ void _build_name_field(account_page *view) {
 }
 
 void _show_rows(account_page *view) {
+  const bool has_focus = elm_object_focus_get(view->list);
   elm_box_clear(view->list);
   view->name_entry = nullptr;
-  for (const GSList *link = view->accounts; link; link = link->next)
-    _build_account_row(view, static_cast<const tavro_account_info *>(link->data));
+  for (const GSList *link = view->accounts; link; link = link->next) {
+    const auto *account = static_cast<const tavro_account_info *>(link->data);
+    Evas_Object *row = _build_account_row(view, account);
+    if (has_focus && account == view->chosen) elm_object_focus_set(row, EINA_TRUE);
+  }
   Evas_Object *other_mark = view->chosen ? nullptr : tavro_icon_add(view->list, "check/accent");
   elm_box_pack_end(view->list, tavro_row_add(view->list, "plus", tavro_text("IDS_OB_BODY_ANOTHER_ACCOUNT"),
                                              nullptr, other_mark, _row_clicked_cb, view));
@@ -127,6 +133,7 @@ void _continue_clicked_cb(void *data, Evas_Object *, void *) {
   // The landing page lies on top now; without this one below it, back leads out of the application.
   Elm_Object_Item *below = elm_naviframe_bottom_item_get(ad->nf);
   if (below != ad->landing_nf_it) elm_object_item_del(below);
+  tavro_attach_waiting_files(ad);
 }
 
 void _page_deleted_cb(void *data, Evas *, Evas_Object *, void *) {

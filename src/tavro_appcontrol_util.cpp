@@ -5,6 +5,7 @@
 
 #include "tavro-main.h"
 #include "tavro_appdata.h"
+#include "tavro_compose_keeper.h"
 #include "tavro_log.h"
 #include "tavro_memory.h"
 #include "tavro_not_yet.h"
@@ -146,6 +147,7 @@ void _show_due_popups(appdata *ad) {
   if (tavro_is_ending()) return;
   tavro_show_due_version_popup(ad);
   tavro_tell_store_was_replaced(ad);
+  tavro_compose_keeper_offer(ad);
 }
 
 }  // namespace

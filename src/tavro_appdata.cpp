@@ -38,17 +38,6 @@ void _free_texts(appdata *ad) {
   TAVRO_FREE(ad->crashed_appId);
 }
 
-void _free_compose_views(appdata *ad) {
-  if (ad->problem_view) {
-    tavro_free_problem_view(ad->problem_view);
-    TAVRO_FREE(ad->problem_view);
-  }
-  if (ad->idea_view) {
-    tavro_free_idea_view(ad->idea_view);
-    TAVRO_FREE(ad->idea_view);
-  }
-}
-
 }  // namespace
 
 void tavro_initialize_application_data(appdata *ad) {
@@ -62,7 +51,7 @@ void tavro_initialize_application_data(appdata *ad) {
 }
 
 void tavro_dealloc_memory(appdata *ad) {
-  _free_compose_views(ad);
+  tavro_free_compose_view(ad);
   _free_texts(ad);
   _free_text_list(ad->image_list);
   for (GSList **list : {&ad->ie_select_box_list, &ad->color_table, &ad->font_table, &ad->banner_list,

@@ -3,6 +3,7 @@
 #include <cstdint>
 
 #include "tavro-main.h"
+#include "tavro_compose_keeper.h"
 #include "tavro_dbmgr.h"
 #include "tavro_drafts.h"
 #include "tavro_log.h"
@@ -35,6 +36,8 @@ void _save_draft(appdata *ad) {
                                   : tavro_save_problem_compose_data(ad, TAVRO_STATUS_DRAFT_SAVED);
   if (id >= 1 || earlier_id < 1) ad->auto_saved_id = id;
   TAVRO_LOGD("ad->auto_saved_id: %d", ad->auto_saved_id);
+  tavro_compose_keeper_note();
+  tavro_compose_keeper_flush();
 }
 
 }  // namespace

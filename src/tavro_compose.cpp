@@ -8,9 +8,10 @@
 #include "tavro-main.h"
 #include "tavro_autosave.h"
 #include "tavro_compose.h"
+#include "tavro_compose_keeper.h"
+#include "tavro_compose_parts.h"
 #include "tavro_compose_strip.h"
 #include "tavro_dbmgr.h"
-#include "tavro_log.h"
 #include "tavro_memory.h"
 #include "tavro_screens.h"
 #include "tavro_targets.h"
@@ -18,30 +19,10 @@
 
 namespace {
 
-// What the screen held when it opened, to tell whether leaving would lose anything. There is one screen at
-// most.
-struct opened_content {
-  std::string title, description;
-  guint attachments;
-  std::string target;
-} _opened;
-
-opened_content _content_of(const compose_view_win *view) {
-  return {elm_entry_entry_get(view->title_entry), elm_entry_entry_get(view->entry),
-          g_slist_length(view->attachments), view->app_name ? view->app_name : ""};
-}
-
-bool _would_lose_something(const compose_view_win *view) {
-  if (!view || !tavro_compose_has_content(view)) return false;
-  const opened_content now = _content_of(view);
-  return now.title != _opened.title || now.description != _opened.description ||
-         now.attachments != _opened.attachments || now.target != _opened.target;
-}
-
 void _show_target(compose_view_win *view, bool is_idea) {
   const bool is_chosen = view->app_name != nullptr;
   elm_object_part_text_set(view->target_button, "elm.text.sub", tavro_text("IDS_OB_BODY_ABOUT"));
-  const char *name = tavro_text(is_chosen ? view->app_name : "IDS_OB_BODY_CHOOSE_TARGET");
+  const char *name = is_chosen ? tavro_target_text(view->app_name) : tavro_text("IDS_OB_BODY_CHOOSE_TARGET");
   tavro_layout_text_set(view->target_button, nullptr, name);
   elm_atspi_accessible_name_set(view->target_button,
                                 (std::string(tavro_text("IDS_OB_BODY_ABOUT")) + ": " + name).c_str());
@@ -71,113 +52,19 @@ void _target_chosen(appdata *ad, const char *name, const char *icon) {
   view->app_icon = TAVRO_STRDUP(icon);
   ad->isPerformanceApp = std::strstr(name, "Performance") != nullptr;
   _show_target(view, ad->type == IDEA);
+  tavro_compose_log_update(ad);
+  tavro_compose_keeper_note();
   evas_object_smart_callback_add(ad->nf, "transition,finished", _focus_title_cb, ad);
-}
-
-// ---- Ending the screen ----
-
-void _forget_view(appdata *ad) {
-  compose_view_win *view = tavro_compose_view(ad);
-  if (view && view->menu_popup) evas_object_del(view->menu_popup);
-  if (ad->problem_view) {
-    tavro_free_problem_view(ad->problem_view);
-    TAVRO_FREE(ad->problem_view);
-  }
-  if (ad->idea_view) {
-    tavro_free_idea_view(ad->idea_view);
-    TAVRO_FREE(ad->idea_view);
-  }
-}
-
-// The screen ends without a new record: its automatic copy goes with it, and so does, when the person says
-// "discard", the draft that it was opened from.
-void _end_without_record(appdata *ad, bool with_draft) {
-  if (ad->auto_saved_id >= 1) tavro_dbmgr_destroy_vocs_by_id(ad->auto_saved_id);
-  if (with_draft && ad->id_to_delete >= 1) tavro_dbmgr_destroy_vocs_by_id(ad->id_to_delete);
-  ad->auto_saved_id = 0;
-  ad->id_to_delete = 0;
-  tavro_autosave_stop();
-  _forget_view(ad);
-}
-
-// A save that fails leaves the screen as it is; one that was refused for its size has said so itself.
-void _finish(appdata *ad, int (*save)(appdata *ad)) {
-  if (save(ad) >= 1) return;
-  if (ad->problem_view && ad->problem_view->server_size_error) return;
-  tavro_popup_show(ad, &ad->cancel_popup, tavro_text("IDS_OB_HEADER_NOT_STORED"),
-                   tavro_text("IDS_OB_BODY_NOT_STORED"), {{tavro_text("IDS_OB_BUTTON_OK"), nullptr}});
-}
-
-void _save_draft(appdata *ad) {
-  if (tavro_compose_view(ad)) _finish(ad, tavro_save_compose_draft);
-}
-
-void _discard(appdata *ad) {
-  _end_without_record(ad, true);
-  tavro_pop_naviframe_middle_items(ad);
-}
-
-void _ask_before_leaving(appdata *ad) {
-  tavro_popup_show(ad, &ad->cancel_popup, tavro_text("IDS_OB_HEADER_KEEP_DRAFT"),
-                   tavro_text(ad->id_to_delete >= 1 ? "IDS_OB_BODY_KEEP_CHANGES" : "IDS_OB_BODY_KEEP_DRAFT"),
-                   {{tavro_text("IDS_OB_BUTTON_STAY"), nullptr},
-                    {tavro_text("IDS_OB_BUTTON_DISCARD"), _discard},
-                    {tavro_text("IDS_OB_BUTTON_SAVE_DRAFT"), _save_draft}});
-}
-
-Eina_Bool _pop_cb(void *data, Elm_Object_Item *) {
-  appdata *ad = static_cast<appdata *>(data);
-  if (!_would_lose_something(tavro_compose_view(ad))) {
-    _end_without_record(ad, false);
-    return EINA_TRUE;
-  }
-  _ask_before_leaving(ad);
-  return EINA_FALSE;
-}
-
-bool _may_close(appdata *ad) {
-  if (!_would_lose_something(tavro_compose_view(ad))) return true;
-  _ask_before_leaving(ad);
-  return false;
-}
-
-Elm_Object_Item *_kept_page(appdata *ad) {
-  const compose_view_win *view = tavro_compose_view(ad);
-  return view ? view->nf_it : nullptr;
-}
-
-void _discard_from_menu(appdata *ad) {
-  if (_would_lose_something(tavro_compose_view(ad)))
-    _ask_before_leaving(ad);
-  else
-    _discard(ad);
-}
-
-void _page_deleted_cb(void *data, Evas *, Evas_Object *page, void *) {
-  appdata *ad = static_cast<appdata *>(data);
-  const compose_view_win *view = tavro_compose_view(ad);
-  if (view && view->layout == page) _forget_view(ad);
 }
 
 // ---- What the person touches ----
 
-void _show_gap(appdata *ad, tavro_compose_gap gap) {
-  const char *body = gap == TAVRO_COMPOSE_NO_TARGET    ? "IDS_OB_BODY_GAP_TARGET"
-                     : gap == TAVRO_COMPOSE_NO_CONTENT ? "IDS_OB_BODY_GAP_CONTENT"
-                                                       : "IDS_OB_BODY_GAP_SIZE";
-  tavro_popup_show(ad, &ad->cancel_popup, tavro_text("IDS_OB_HEADER_NOT_YET"), tavro_text(body),
-                   {{tavro_text("IDS_OB_BUTTON_OK"), nullptr}});
+void _send_clicked_cb(void *data, Evas_Object *, void *) {
+  tavro_compose_send(static_cast<appdata *>(data));
 }
 
-void _send_clicked_cb(void *data, Evas_Object *, void *) {
-  appdata *ad = static_cast<appdata *>(data);
-  compose_view_win *view = tavro_compose_view(ad);
-  if (!view) return;
-  const tavro_compose_gap gap = tavro_compose_check(view, tavro_attachment_size_limit());
-  if (gap == TAVRO_COMPOSE_NO_TARGET || gap == TAVRO_COMPOSE_NO_CONTENT || (gap && ad->type == IDEA))
-    _show_gap(ad, gap);
-  else
-    _finish(ad, tavro_send_compose_data);
+void _show_what_is_sent(appdata *ad) {
+  if (tavro_compose_view(ad)) tavro_create_review_page(ad, tavro_compose_send_from_review);
 }
 
 void _menu_clicked_cb(void *data, Evas_Object *, void *) {
@@ -185,8 +72,13 @@ void _menu_clicked_cb(void *data, Evas_Object *, void *) {
   compose_view_win *view = tavro_compose_view(ad);
   if (!view) return;
   tavro_menu_show(ad, &view->menu_popup,
-                  {{tavro_text("IDS_OB_BUTTON_SAVE_DRAFT"), _save_draft},
-                   {tavro_text("IDS_OB_BUTTON_DISCARD"), _discard_from_menu}});
+                  {{tavro_text("IDS_OB_BUTTON_SAVE_DRAFT"), tavro_compose_save_draft},
+                   {tavro_text("IDS_OB_HEADER_WHAT_IS_SENT"), _show_what_is_sent},
+                   {tavro_text("IDS_OB_BUTTON_DISCARD"), tavro_compose_discard}});
+}
+
+void _typed_cb(void *, Evas_Object *, void *) {
+  tavro_compose_keeper_note();
 }
 
 void _target_clicked_cb(void *data, Evas_Object *, void *) {
@@ -238,7 +130,18 @@ Evas_Object *_build_content(appdata *ad, compose_view_win *view, const char *hin
   view->title_entry = _build_field(box, tavro_text("IDS_OB_BODY_TITLE"), true, 50);
   view->entry = _build_field(box, hint, false, 128);
   tavro_compose_strip_build(ad, view, box);
+  tavro_compose_dump_build(ad, box);
+  if (ad->problem_view) tavro_compose_log_build(ad, ad->problem_view, box);
   return scroller;
+}
+
+void _build_bottom(appdata *ad, compose_view_win *view) {
+  view->bottom = tavro_layout_add(view->layout, "tavro/compose/bottom");
+  Evas_Object *send = tavro_button_add(view->bottom, "tavro_primary", tavro_text("IDS_OB_BUTTON_SEND"),
+                                       nullptr, nullptr, _send_clicked_cb, ad);
+  elm_object_part_content_set(view->bottom, "tavro.swallow.button", send);
+  elm_object_part_content_set(view->layout, "tavro.swallow.bottom", view->bottom);
+  elm_object_signal_emit(view->layout, "tavro,bottom", "tavro");
 }
 
 void _build_page(appdata *ad, compose_view_win *view, const svc_voc_data *draft, const char *title,
@@ -250,23 +153,20 @@ void _build_page(appdata *ad, compose_view_win *view, const svc_voc_data *draft,
     view->app_icon = draft->app_icon && *draft->app_icon ? TAVRO_STRDUP(draft->app_icon) : nullptr;
   }
   view->layout = tavro_page_add(ad, title, "close");
-  evas_object_event_callback_add(view->layout, EVAS_CALLBACK_DEL, _page_deleted_cb, ad);
   tavro_page_action_add(view->layout, "more", tavro_text("IDS_OB_BUTTON_MORE"), _menu_clicked_cb, ad);
+  tavro_page_action_add(view->layout, "send", tavro_text("IDS_OB_BUTTON_SEND"), _send_clicked_cb, ad);
   elm_object_content_set(view->layout, _build_content(ad, view, hint));
-  view->bottom = tavro_layout_add(view->layout, "tavro/compose/bottom");
-  Evas_Object *send = tavro_button_add(view->bottom, "tavro_primary", tavro_text("IDS_OB_BUTTON_SEND"),
-                                       nullptr, nullptr, _send_clicked_cb, ad);
-  elm_object_part_content_set(view->bottom, "tavro.swallow.button", send);
-  elm_object_part_content_set(view->layout, "tavro.swallow.bottom", view->bottom);
-  elm_object_signal_emit(view->layout, "tavro,bottom", "tavro");
+  _build_bottom(ad, view);
   if (draft) _fill_from_draft(view, draft);
-  _opened = _content_of(view);
+  tavro_compose_remember_opened(ad);
   tavro_compose_strip_refresh(ad);
   view->nf_it = tavro_page_push(ad, view->layout, title);
-  elm_naviframe_item_pop_cb_set(view->nf_it, _pop_cb, ad);
+  tavro_compose_guard(ad);
   evas_object_smart_callback_add(ad->nf, "transition,finished", _focus_title_cb, ad);
-  tavro_set_page_guard({_may_close, _kept_page});
+  for (Evas_Object *entry : {view->title_entry, view->entry})
+    evas_object_smart_callback_add(entry, "changed", _typed_cb, nullptr);
   tavro_autosave_start(ad);
+  tavro_compose_keeper_start(ad);
 }
 
 // The dump and the system log that a draft of a problem holds.
@@ -283,20 +183,6 @@ void _take_files(problem_view_win *view, const svc_voc_data *draft) {
 }
 
 }  // namespace
-
-bool tavro_leave_compose_page(appdata *ad) {
-  compose_view_win *view = tavro_compose_view(ad);
-  if (!view) return true;
-  if (_would_lose_something(view)) {
-    elm_naviframe_item_pop_to(view->nf_it);
-    _ask_before_leaving(ad);
-    return false;
-  }
-  Elm_Object_Item *page = view->nf_it;
-  _end_without_record(ad, false);
-  elm_object_item_del(page);
-  return true;
-}
 
 void tavro_create_problem_page(appdata *ad, const svc_voc_data *draft) {
   if (!tavro_leave_compose_page(ad)) return;

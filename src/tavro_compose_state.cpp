@@ -1,27 +1,78 @@
 // State of a compose screen without its widgets' looks.
 #include <Elementary.h>
+#include <fcntl.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <algorithm>
+#include <cstdlib>
 #include <cstring>
+#include <string_view>
 
 #include "tavro-main.h"
 #include "tavro_compose.h"
+#include "tavro_dbmgr.h"
+#include "tavro_handles.h"
 #include "tavro_log.h"
 #include "tavro_memory.h"
 
+namespace {
+
+struct file_mark {
+  size_t offset;
+  std::string_view bytes;
+};
+
+// How the kinds begin that support can open.
+constexpr file_mark kKnownMarks[] = {{0, "\xFF\xD8\xFF"}, {0, "\x89PNG\r\n\x1A\n"}, {4, "ftyp"}};
+
+// Opened without waiting, should the path have become something else than a file.
+bool _is_known_kind(const char *path) {
+  char head[12] = {};
+  const TavroFd file(open(path, O_RDONLY | O_NONBLOCK | O_CLOEXEC));
+  if (!file || read(file.get(), head, sizeof head) != sizeof head) return false;
+  for (const file_mark &mark : kKnownMarks)
+    if (mark.bytes.compare(0, mark.bytes.npos, head + mark.offset, mark.bytes.size()) == 0) return true;
+  return false;
+}
+
+// A relative path means nothing later on, and what lies beside the store is the client's own.
+bool _is_off_limits(const char *path) {
+  const TavroGText real(realpath(path, nullptr));
+  return *path != '/' || (real && g_str_has_prefix(real.get(), TAVRO_DBMGR_FOLDER "/"));
+}
+
+GSList *_find(const compose_view_win *view, const char *path) {
+  return g_slist_find_custom(view->attachments, path, [](gconstpointer attached, gconstpointer wanted) {
+    return std::strcmp(static_cast<const char *>(attached), static_cast<const char *>(wanted));
+  });
+}
+
+gint64 _size_or_none(const char *path) {
+  return path ? std::max<gint64>(tavro_attachment_size(path), 0) : 0;
+}
+
+const compose_view_win *_open_view(const appdata *ad) {
+  return ad->idea_view ? static_cast<const compose_view_win *>(ad->idea_view) : ad->problem_view;
+}
+
+}  // namespace
+
 compose_view_win *tavro_compose_view(appdata *ad) {
-  if (ad->idea_view) return ad->idea_view;
-  return ad->problem_view;
+  return const_cast<compose_view_win *>(_open_view(ad));
 }
 
-bool tavro_compose_has_content(const compose_view_win *view) {
-  return !elm_entry_is_empty(view->entry) || !elm_entry_is_empty(view->title_entry) || view->attachments;
+bool tavro_compose_has_content(const appdata *ad) {
+  const compose_view_win *view = _open_view(ad);
+  if (!view) return false;
+  return !elm_entry_is_empty(view->entry) || !elm_entry_is_empty(view->title_entry) || view->attachments ||
+         (ad->problem_view && ad->problem_view->dump_filepath);
 }
 
-tavro_compose_gap tavro_compose_check(const compose_view_win *view, gint64 limit) {
+tavro_compose_gap tavro_compose_check(const appdata *ad, gint64 limit) {
+  const compose_view_win *view = _open_view(ad);
   if (!view->app_name) return TAVRO_COMPOSE_NO_TARGET;
-  if (!tavro_compose_has_content(view)) return TAVRO_COMPOSE_NO_CONTENT;
+  if (!tavro_compose_has_content(ad)) return TAVRO_COMPOSE_NO_CONTENT;
   return view->buffer > limit ? TAVRO_COMPOSE_TOO_LARGE : TAVRO_COMPOSE_COMPLETE;
 }
 
@@ -31,31 +82,68 @@ gint64 tavro_attachment_size(const char *path) {
   return info.st_size;
 }
 
-bool tavro_compose_attach(compose_view_win *view, const char *path) {
-  for (const GSList *link = view->attachments; link; link = link->next)
-    if (std::strcmp(static_cast<const char *>(link->data), path) == 0) return true;
+tavro_attachment_fault tavro_attachment_check(const char *path) {
   const gint64 size = tavro_attachment_size(path);
-  if (size < 0) {
-    TAVRO_LOGD("cannot attach %s", path);
+  if (size < 0 || _is_off_limits(path)) return TAVRO_ATTACHMENT_UNREADABLE;
+  if (size == 0) return TAVRO_ATTACHMENT_EMPTY;
+  if (size > tavro_attachment_size_limit()) return TAVRO_ATTACHMENT_TOO_LARGE;
+  return _is_known_kind(path) ? TAVRO_ATTACHMENT_GOOD : TAVRO_ATTACHMENT_OTHER_KIND;
+}
+
+bool tavro_compose_attach(compose_view_win *view, const char *path) {
+  if (_find(view, path)) return true;
+  const tavro_attachment_fault fault = tavro_attachment_check(path);
+  if (fault != TAVRO_ATTACHMENT_GOOD) {
+    TAVRO_LOGD("cannot attach %s: %d", path, fault);
     return false;
   }
   view->attachments = g_slist_append(view->attachments, TAVRO_STRDUP(path));
-  view->buffer += size;
+  tavro_compose_count(view);
   return true;
 }
 
 void tavro_compose_detach(compose_view_win *view, const char *path) {
-  for (GSList *link = view->attachments; link; link = link->next) {
+  if (GSList *link = _find(view, path)) {
     char *attached = static_cast<char *>(link->data);
-    if (std::strcmp(attached, path) != 0) continue;
     view->attachments = g_slist_delete_link(view->attachments, link);
     TAVRO_FREE(attached);
-    break;
   }
-  // Files change while they are attached: add up what is there now.
+  tavro_compose_count(view);
+}
+
+void tavro_compose_move(compose_view_win *view, const char *path, int steps) {
+  GSList *link = _find(view, path);
+  if (!link) return;
+  const int last = static_cast<int>(g_slist_length(view->attachments)) - 1;
+  const int place = std::clamp(g_slist_position(view->attachments, link) + steps, 0, last);
+  gpointer attached = link->data;
+  view->attachments = g_slist_delete_link(view->attachments, link);
+  view->attachments = g_slist_insert(view->attachments, attached, place);
+}
+
+void tavro_compose_count(compose_view_win *view) {
   view->buffer = 0;
+  for (const GSList *link = view->attachments; link; link = link->next)
+    view->buffer += _size_or_none(static_cast<const char *>(link->data));
+}
+
+std::vector<std::string> tavro_compose_lost_attachments(const compose_view_win *view) {
+  std::vector<std::string> lost;
   for (const GSList *link = view->attachments; link; link = link->next) {
-    const gint64 size = tavro_attachment_size(static_cast<const char *>(link->data));
-    if (size > 0) view->buffer += size;
+    const char *path = static_cast<const char *>(link->data);
+    if (tavro_attachment_size(path) <= 0) lost.emplace_back(path);
   }
+  return lost;
+}
+
+std::string tavro_file_name(const char *path) {
+  const char *slash = std::strrchr(path, '/');
+  return slash ? slash + 1 : path;
+}
+
+gint64 tavro_compose_total(const appdata *ad) {
+  const compose_view_win *view = _open_view(ad);
+  const problem_view_win *problem = ad->problem_view;
+  return view->buffer +
+         (problem ? _size_or_none(problem->syslog_filepath) + _size_or_none(problem->dump_filepath) : 0);
 }

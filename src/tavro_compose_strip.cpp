@@ -1,37 +1,33 @@
 #include "tavro_compose_strip.h"
 
+#include <elm_atspi.h>
+
 #include <algorithm>
-#include <cstdio>
 #include <cstring>
 #include <string>
 
 #include "tavro-common.h"
 #include "tavro-main.h"
 #include "tavro_compose.h"
+#include "tavro_compose_keeper.h"
+#include "tavro_handles.h"
 #include "tavro_memory.h"
 #include "tavro_screens.h"
+#include "tavro_thumbnails.h"
 #include "tavro_widgets.h"
 
 namespace {
 
 constexpr int kThumbUnits = 72;
+// How long a finger rests on a picture before its menu comes up.
+constexpr double kLongPressSeconds = 0.5;
 
-void _pictures_chosen(appdata *ad, const GSList *paths) {
-  compose_view_win *view = tavro_compose_view(ad);
-  if (!view) return;
-  std::string refused;
-  for (const GSList *link = paths; link; link = link->next) {
-    const char *path = static_cast<const char *>(link->data);
-    if (!tavro_compose_attach(view, path)) refused += (refused.empty() ? "" : "\n") + std::string(path);
-  }
-  tavro_compose_strip_refresh(ad);
-  if (!refused.empty())
-    tavro_popup_show(ad, &ad->cancel_popup, tavro_text("IDS_OB_HEADER_NOT_ATTACHED"), refused.c_str(),
-                     {{tavro_text("IDS_OB_BUTTON_OK"), nullptr}});
-}
+// The picture under the finger, until it is lifted or its menu has come up.
+Ecore_Timer *_long_press = nullptr;
+guint _place_to_focus = 0;  // in the strip that is rebuilt after a removal
 
-void _attach_clicked_cb(void *data, Evas_Object *, void *) {
-  tavro_create_gallery_picker(static_cast<appdata *>(data), _pictures_chosen);
+const char *_path_of(const Evas_Object *widget) {
+  return static_cast<const char *>(evas_object_data_get(widget, "path"));
 }
 
 void _path_deleted_cb(void *data, Evas *, Evas_Object *, void *) {
@@ -39,48 +35,136 @@ void _path_deleted_cb(void *data, Evas *, Evas_Object *, void *) {
   TAVRO_FREE(path);
 }
 
+void _name_path(Evas_Object *widget, const char *path) {
+  char *own_path = TAVRO_STRDUP(path);
+  evas_object_data_set(widget, "path", own_path);
+  evas_object_event_callback_add(widget, EVAS_CALLBACK_FREE, _path_deleted_cb, own_path);
+}
+
+appdata *_ad_of(const Evas_Object *thumb) {
+  return static_cast<appdata *>(evas_object_data_get(thumb, "app_data"));
+}
+
+// ---- What the person does with a picture ----
+
+void _end_long_press() {
+  if (_long_press) ecore_timer_del(_long_press);
+  _long_press = nullptr;
+}
+
+void _show_menu(const Evas_Object *thumb) {
+  tavro_compose_show_attachment_menu(_ad_of(thumb), _path_of(thumb));
+}
+
+// The release that follows is no tap: the picture lies under the menu by then.
+Eina_Bool _long_pressed_cb(void *data) {
+  _long_press = nullptr;
+  Evas_Object *thumb = static_cast<Evas_Object *>(data);
+  evas_object_data_set(thumb, "was_pressed_long", thumb);
+  _show_menu(thumb);
+  return ECORE_CALLBACK_CANCEL;
+}
+
+void _mouse_down_cb(void *, Evas *, Evas_Object *thumb, void *) {
+  _end_long_press();
+  evas_object_data_del(thumb, "was_pressed_long");
+  _long_press = ecore_timer_add(kLongPressSeconds, _long_pressed_cb, thumb);
+}
+
+// Also when the strip is moved by the finger, or the picture goes.
+void _mouse_up_cb(void *, Evas *, Evas_Object *, void *) {
+  _end_long_press();
+}
+
+void _mouse_moved_cb(void *, Evas *, Evas_Object *, void *event_info) {
+  const Evas_Event_Mouse_Move *move = static_cast<Evas_Event_Mouse_Move *>(event_info);
+  if (move->event_flags & EVAS_EVENT_FLAG_ON_HOLD) _end_long_press();
+}
+
+void _key_down_cb(void *, Evas *, Evas_Object *thumb, void *event_info) {
+  const Evas_Event_Key_Down *key = static_cast<Evas_Event_Key_Down *>(event_info);
+  const bool is_menu_key = std::strcmp(key->key, "Menu") == 0;
+  const bool is_shift_f10 =
+      std::strcmp(key->key, "F10") == 0 && evas_key_modifier_is_set(key->modifiers, "Shift");
+  if (is_menu_key || is_shift_f10) _show_menu(thumb);
+}
+
+void _thumb_clicked_cb(void *data, Evas_Object *thumb, void *) {
+  if (!evas_object_data_del(thumb, "was_pressed_long"))
+    tavro_create_picture_page(static_cast<appdata *>(data), _path_of(thumb));
+}
+
 void _remove_clicked_cb(void *data, Evas_Object *button, void *) {
-  appdata *ad = static_cast<appdata *>(data);
-  compose_view_win *view = tavro_compose_view(ad);
-  if (!view) return;
-  tavro_compose_detach(view, static_cast<const char *>(evas_object_data_get(button, "path")));
-  // The clicked button goes with the rebuilt strip, but not from inside its own callback.
-  ecore_job_add([](void *job_data) { tavro_compose_strip_refresh(static_cast<appdata *>(job_data)); }, ad);
+  tavro_compose_strip_remove(static_cast<appdata *>(data), _path_of(button));
 }
 
-std::string _file_name(const char *path) {
-  const char *slash = std::strrchr(path, '/');
-  return slash ? slash + 1 : path;
+void _attach_clicked_cb(void *data, Evas_Object *, void *) {
+  tavro_compose_show_sources(static_cast<appdata *>(data));
 }
 
-Evas_Object *_build_thumb(appdata *ad, compose_view_win *view, const char *path) {
-  Evas_Object *frame = tavro_layout_add(view->strip, "tavro/compose/attachment");
-  const std::string name = _file_name(path);
+// ---- The strip ----
+
+Evas_Object *_build_thumb(appdata *ad, Evas_Object *frame, const char *path, const std::string &name) {
   Evas_Object *thumb =
-      tavro_button_add(frame, "tavro_thumb", nullptr, tavro_picture_add(frame, path, kThumbUnits),
-                       name.c_str(), nullptr, nullptr);
-  elm_object_content_set(frame, thumb);
+      tavro_button_add(frame, "tavro_thumb", nullptr, tavro_thumbnail_add(frame, path, kThumbUnits),
+                       name.c_str(), _thumb_clicked_cb, ad);
+  elm_atspi_accessible_description_set(thumb, tavro_text("IDS_OB_BODY_ATTACHMENT_KEYS"));
+  _name_path(thumb, path);
+  evas_object_data_set(thumb, "app_data", ad);
+  evas_object_event_callback_add(thumb, EVAS_CALLBACK_MOUSE_DOWN, _mouse_down_cb, nullptr);
+  evas_object_event_callback_add(thumb, EVAS_CALLBACK_MOUSE_UP, _mouse_up_cb, nullptr);
+  evas_object_event_callback_add(thumb, EVAS_CALLBACK_MOUSE_MOVE, _mouse_moved_cb, nullptr);
+  evas_object_event_callback_add(thumb, EVAS_CALLBACK_DEL, _mouse_up_cb, nullptr);
+  evas_object_event_callback_add(thumb, EVAS_CALLBACK_KEY_DOWN, _key_down_cb, nullptr);
+  return thumb;
+}
+
+Evas_Object *_build_attachment(appdata *ad, Evas_Object *strip, const char *path) {
+  Evas_Object *frame = tavro_layout_add(strip, "tavro/compose/attachment");
+  const std::string name = tavro_file_name(path);
+  elm_object_content_set(frame, _build_thumb(ad, frame, path, name));
   const std::string remove_name = std::string(tavro_text("IDS_OB_BUTTON_REMOVE")) + " " + name;
   Evas_Object *remove = tavro_button_add(frame, "tavro_remove", nullptr, tavro_icon_add(frame, "close/small"),
                                          remove_name.c_str(), _remove_clicked_cb, ad);
-  char *own_path = TAVRO_STRDUP(path);
-  evas_object_data_set(remove, "path", own_path);
-  evas_object_event_callback_add(remove, EVAS_CALLBACK_FREE, _path_deleted_cb, own_path);
+  _name_path(remove, path);
   elm_object_part_content_set(frame, "tavro.swallow.remove", remove);
   return frame;
 }
 
-void _show_size(compose_view_win *view) {
-  const gint64 limit = tavro_attachment_size_limit();
-  char text[128];
-  std::snprintf(text, sizeof text, tavro_text("IDS_OB_BODY_PS1_OF_PS2_MB"),
-                tavro_megabytes(view->buffer).c_str(), tavro_megabytes(limit).c_str());
-  tavro_layout_text_set(view->bottom, "elm.text", text);
-  const double used = limit > 0 ? static_cast<double>(view->buffer) / static_cast<double>(limit) : 1.0;
-  edje_object_part_drag_value_set(elm_layout_edje_get(view->bottom), "tavro.drag.used", std::min(used, 1.0),
-                                  0.0);
-  elm_object_signal_emit(view->bottom, view->buffer > limit ? "tavro,over" : "tavro,within", "tavro");
-  if (view->buffer == 0) elm_object_signal_emit(view->bottom, "tavro,none", "tavro");
+void _set_row_text(Evas_Object *row, const char *path) {
+  const gint64 size = tavro_attachment_size(path);
+  const std::string text =
+      tavro_file_name(path) + " \u00B7 " +
+      (size < 0 ? std::string(tavro_text("IDS_OB_BODY_FILE_UNREADABLE")) : tavro_size_text(size));
+  tavro_layout_text_set(row, "elm.text.sub", text.c_str());
+}
+
+// What asked for the removal goes with the rebuilt strip, but not from inside its own callback.
+void _removed_cb(void *data) {
+  appdata *ad = static_cast<appdata *>(data);
+  const compose_view_win *view = tavro_compose_view(ad);
+  if (!view) return;
+  tavro_compose_strip_refresh(ad);
+  tavro_compose_strip_focus(ad,
+                            static_cast<const char *>(g_slist_nth_data(view->attachments, _place_to_focus)));
+}
+
+// ---- The crash dump ----
+
+void _dump_removed_cb(void *data, Evas_Object *, void *) {
+  appdata *ad = static_cast<appdata *>(data);
+  if (!ad->problem_view) return;
+  TAVRO_FREE(ad->problem_view->dump_filename);
+  TAVRO_FREE(ad->problem_view->dump_filepath);
+  // Not from inside the button's own callback.
+  ecore_job_add([](void *job_data) { tavro_compose_strip_refresh(static_cast<appdata *>(job_data)); }, ad);
+}
+
+void _refresh_dump(appdata *ad) {
+  problem_view_win *view = ad->problem_view;
+  if (!view || !view->dump_row || view->dump_filepath) return;
+  evas_object_del(view->dump_row);
+  view->dump_row = nullptr;
 }
 
 }  // namespace
@@ -89,7 +173,6 @@ void tavro_compose_strip_build(appdata *, compose_view_win *view, Evas_Object *b
   Evas_Object *caption = tavro_layout_add(box, "tavro/caption");
   tavro_fill_width(caption);
   elm_object_text_set(caption, tavro_text("IDS_OB_HEADER_ATTACHMENTS"));
-  elm_box_pack_end(box, caption);
   Evas_Object *scroller = elm_scroller_add(box);
   elm_object_style_set(scroller, "tavro");
   elm_scroller_policy_set(scroller, ELM_SCROLLER_POLICY_OFF, ELM_SCROLLER_POLICY_OFF);
@@ -97,13 +180,33 @@ void tavro_compose_strip_build(appdata *, compose_view_win *view, Evas_Object *b
   tavro_fill_width(scroller);
   view->strip = elm_box_add(scroller);
   elm_box_horizontal_set(view->strip, EINA_TRUE);
-  elm_box_align_set(view->strip, 0.0, 0.5);
-  const int gap = static_cast<int>(10 * elm_config_scale_get());
-  elm_box_padding_set(view->strip, gap, 0);
+  elm_box_align_set(view->strip, 0.0, 1.0);
   evas_object_show(view->strip);
   elm_object_content_set(scroller, view->strip);
   evas_object_show(scroller);
-  elm_box_pack_end(box, scroller);
+  // The attachments bring the room between them and the caption along.
+  Evas_Object *group = elm_box_add(box);
+  tavro_fill_width(group);
+  elm_box_pack_end(group, caption);
+  elm_box_pack_end(group, scroller);
+  evas_object_show(group);
+  elm_box_pack_end(box, group);
+}
+
+void tavro_compose_dump_build(appdata *ad, Evas_Object *box) {
+  problem_view_win *view = ad->problem_view;
+  if (!view || !view->dump_filepath) return;
+  Evas_Object *row = view->dump_row = tavro_layout_add(box, "tavro/compose/file");
+  tavro_fill_width(row);
+  elm_object_part_content_set(row, "elm.swallow.icon", tavro_icon_add(row, "file"));
+  tavro_layout_text_set(row, "elm.text", tavro_text("IDS_OB_BODY_CRASH_DUMP"));
+  _set_row_text(row, view->dump_filepath);
+  const std::string name =
+      std::string(tavro_text("IDS_OB_BUTTON_REMOVE")) + " " + tavro_text("IDS_OB_BODY_CRASH_DUMP");
+  Evas_Object *remove = tavro_button_add(row, "tavro_icon", nullptr, tavro_icon_add(row, "close"),
+                                         name.c_str(), _dump_removed_cb, ad);
+  elm_object_part_content_set(row, "elm.swallow.end", remove);
+  elm_box_pack_end(box, row);
 }
 
 void tavro_compose_strip_refresh(appdata *ad) {
@@ -111,10 +214,51 @@ void tavro_compose_strip_refresh(appdata *ad) {
   if (!view) return;
   elm_box_clear(view->strip);
   for (const GSList *link = view->attachments; link; link = link->next)
-    elm_box_pack_end(view->strip, _build_thumb(ad, view, static_cast<const char *>(link->data)));
-  Evas_Object *attach =
-      tavro_button_add(view->strip, "tavro_attach", nullptr, tavro_icon_add(view->strip, "plus"),
-                       tavro_text("IDS_OB_BUTTON_ATTACH_PICTURES"), _attach_clicked_cb, ad);
-  elm_box_pack_end(view->strip, attach);
-  _show_size(view);
+    elm_box_pack_end(view->strip, _build_attachment(ad, view->strip, static_cast<const char *>(link->data)));
+  Evas_Object *frame = tavro_layout_add(view->strip, "tavro/compose/attachment");
+  elm_object_content_set(
+      frame, tavro_button_add(frame, "tavro_attach", nullptr, tavro_icon_add(frame, "plus"),
+                              tavro_text("IDS_OB_BUTTON_ATTACH_PICTURES"), _attach_clicked_cb, ad));
+  elm_box_pack_end(view->strip, frame);
+  _refresh_dump(ad);
+  tavro_compose_size_refresh(ad);
+  tavro_compose_keeper_note();
+}
+
+void tavro_compose_strip_focus(appdata *ad, const char *path) {
+  const compose_view_win *view = tavro_compose_view(ad);
+  if (!view) return;
+  Eina_List *frames = elm_box_children_get(view->strip);
+  const GSList *link = view->attachments;
+  unsigned place = 0;
+  for (; link && path && std::strcmp(static_cast<const char *>(link->data), path) != 0; link = link->next)
+    ++place;
+  void *frame = link && path ? eina_list_nth(frames, place) : eina_list_last_data_get(frames);
+  eina_list_free(frames);
+  if (frame) elm_object_focus_set(elm_object_content_get(static_cast<Evas_Object *>(frame)), EINA_TRUE);
+}
+
+void tavro_compose_strip_remove(appdata *ad, const char *path) {
+  compose_view_win *view = tavro_compose_view(ad);
+  if (!view) return;
+  _place_to_focus = 0;
+  for (const GSList *link = view->attachments;
+       link && std::strcmp(static_cast<const char *>(link->data), path) != 0; link = link->next)
+    ++_place_to_focus;
+  tavro_compose_detach(view, path);
+  ecore_job_add(_removed_cb, ad);
+}
+
+void tavro_compose_size_refresh(appdata *ad) {
+  const compose_view_win *view = tavro_compose_view(ad);
+  if (!view || !view->bottom) return;
+  const gint64 total = tavro_compose_total(ad), limit = tavro_attachment_size_limit();
+  const TavroGText text(g_strdup_printf(tavro_text("IDS_OB_BODY_PS1_OF_PS2_MB"),
+                                        tavro_megabytes(total).c_str(), tavro_megabytes(limit).c_str()));
+  tavro_layout_text_set(view->bottom, "elm.text", text.get());
+  const double used = static_cast<double>(total) / static_cast<double>(limit);
+  edje_object_part_drag_value_set(elm_layout_edje_get(view->bottom), "tavro.drag.used", std::min(used, 1.0),
+                                  0.0);
+  elm_object_signal_emit(view->bottom, total > limit ? "tavro,over" : "tavro,within", "tavro");
+  if (total == 0) elm_object_signal_emit(view->bottom, "tavro,none", "tavro");
 }

@@ -42,7 +42,7 @@ int _tavro_dbus_method_sync(const char *destination, const char *path, const cha
   g_dbus_message_set_flags(message.get(), G_DBUS_MESSAGE_FLAGS_NO_REPLY_EXPECTED);
   const gboolean sent = g_dbus_connection_send_message(bus.get(), message.get(),
                                                        G_DBUS_SEND_MESSAGE_FLAGS_NONE, nullptr, nullptr);
-  // Nobody else holds this connection: it closes here, and what it has not written by then is lost.
+  // Unless somebody else holds this connection it closes here, and what it has not written is lost.
   g_dbus_connection_flush_sync(bus.get(), nullptr, nullptr);
   TAVRO_LOGD("-- start 5 -- = %d", sent);
   TAVRO_LOGD("-- end --");

@@ -26,18 +26,6 @@ TavroFile _create_private_file(const char *filename) {
   return TavroFile(file);
 }
 
-bool storage_device_cb(int storage_id, storage_type_e type, storage_state_e, const char *, void *user_data) {
-  if (type != STORAGE_TYPE_INTERNAL) return true;
-  unsigned long long total = 0;
-  unsigned long long available = 0;
-  storage_get_total_space(storage_id, &total);
-  storage_get_available_space(storage_id, &available);
-  std::fprintf(static_cast<FILE *>(user_data),
-               "Internal Memory - Total : %lld bytes, Available : %lld bytes\n",
-               static_cast<long long>(total), static_cast<long long>(available));
-  return false;
-}
-
 // One SIM. A value that cannot be read is written as 0.
 void _add_sim(FILE *file, telephony_h sim) {
   telephony_network_rssi_e rssi = TELEPHONY_NETWORK_RSSI_0;
@@ -53,6 +41,8 @@ void _add_sim(FILE *file, telephony_h sim) {
   telephony_network_get_service_state(sim, &service_state);
   telephony_network_get_lac(sim, &lac);
   const TavroText name(TAVRO_ADOPT(name_text));
+  // One fact is one line, whatever a network calls itself.
+  if (name) g_strdelimit(name.get(), "\r\n", ' ');
   if (!name || !*name) {
     TAVRO_LOGD("Network name is NULL");
     return;
@@ -60,6 +50,12 @@ void _add_sim(FILE *file, telephony_h sim) {
   std::fprintf(
       file, "RSSI : %d, Network_info - Name : %s, Cell_Id : %d, Status : %d, Service_State : %d, LAC : %d\n",
       static_cast<int>(rssi), name.get(), cell_id, is_roaming ? 1 : 0, static_cast<int>(service_state), lac);
+}
+
+void _write_all(FILE *file) {
+  _tavro_connmgr_add_hardware_status(file);
+  _tavro_connmgr_add_performance_status(file);
+  _tavro_connmgr_add_network_status(file);
 }
 
 }  // namespace
@@ -92,6 +88,18 @@ void _tavro_connmgr_add_hardware_status(FILE *file) {
   _tavro_connmgr_add_battery_info(file);
 }
 
+bool storage_device_cb(int storage_id, storage_type_e type, storage_state_e, const char *, void *user_data) {
+  if (type != STORAGE_TYPE_INTERNAL) return true;
+  unsigned long long total = 0;
+  unsigned long long available = 0;
+  storage_get_total_space(storage_id, &total);
+  storage_get_available_space(storage_id, &available);
+  std::fprintf(static_cast<FILE *>(user_data),
+               "Internal Memory - Total : %lld bytes, Available : %lld bytes\n",
+               static_cast<long long>(total), static_cast<long long>(available));
+  return false;
+}
+
 void _tavro_connmgr_add_storage_info(FILE *file) {
   storage_foreach_device_supported(storage_device_cb, file);
 }
@@ -111,6 +119,17 @@ void _tavro_connmgr_add_network_status(FILE *file) {
   telephony_deinit(&sims);
 }
 
+std::string tavro_device_status_text() {
+  char *text = nullptr;
+  size_t size = 0;
+  TavroFile stream(open_memstream(&text, &size));
+  if (!stream) return {};
+  _write_all(stream.get());
+  stream.reset();  // closing puts the text in its place
+  const TavroText owned(TAVRO_ADOPT(text));
+  return owned ? std::string(owned.get(), size) : "";
+}
+
 void tavro_get_extra_device_data(const char *filename) {
   const std::string unfinished_name = std::string(filename) + ".part";
   const TavroFile file = _create_private_file(unfinished_name.c_str());
@@ -119,9 +138,7 @@ void tavro_get_extra_device_data(const char *filename) {
     return;
   }
   TavroUnfinishedFile unfinished(unfinished_name);
-  _tavro_connmgr_add_hardware_status(file.get());
-  _tavro_connmgr_add_performance_status(file.get());
-  _tavro_connmgr_add_network_status(file.get());
+  _write_all(file.get());
   const bool is_whole = std::fflush(file.get()) == 0 && rename(unfinished_name.c_str(), filename) == 0;
   if (is_whole) {
     unfinished.keep();

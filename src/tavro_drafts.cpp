@@ -87,7 +87,8 @@ BugReport _make_report(const appdata *ad, const char *user_name, int status) {
     report->dump_name = TAVRO_STRDUP(view->dump_filename);
   }
   _fill_system_log(report.get(), ad, view);
-  if (status == TAVRO_STATUS_SENDING) tavro_add_extra_data_file(report.get());
+  if (status == TAVRO_STATUS_SENDING && !view->is_device_status_removed)
+    tavro_add_extra_data_file(report.get());
   return report;
 }
 

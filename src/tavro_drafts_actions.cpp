@@ -1,21 +1,25 @@
 #include <notification.h>
 #include <sys/stat.h>
 
+#include <algorithm>
 #include <cstdio>
 
 #include "tavro-common.h"
 #include "tavro-main.h"
 #include "tavro_autosave.h"
+#include "tavro_compose_keeper.h"
 #include "tavro_dbmgr.h"
 #include "tavro_drafts.h"
 #include "tavro_drafts_save.h"
 #include "tavro_memory.h"
 #include "tavro_preferences.h"
+#include "tavro_system_log.h"
 
 namespace {
 
 constexpr gint64 kBytesPerKilobyte = 1024;
 constexpr gint64 kDefaultSizeLimitBytes = 31457280;
+constexpr gint64 kLargestSizeLimitBytes = 1073741824;  // more than any desk takes
 constexpr int kRefused = -1;
 
 gint64 _file_size(const char *path) {
@@ -55,6 +59,7 @@ int _end_compose_screen(appdata *ad, int status) {
   if (ad->problem_view) ad->problem_view->server_size_error = false;  // of an earlier try
   const int opened_from = ad->id_to_delete;
   const int auto_saved = ad->auto_saved_id;
+  tavro_compose_keeper_flush();  // so that it is known for the same report if the process ends in between
   ad->auto_saved_id = 0;
   const int id = _save_by_kind(ad, status);
   if (id < 1) {
@@ -63,6 +68,8 @@ int _end_compose_screen(appdata *ad, int status) {
   }
   if (opened_from >= 1) tavro_dbmgr_destroy_vocs_by_id(opened_from);
   if (auto_saved >= 1 && auto_saved != opened_from) tavro_dbmgr_destroy_vocs_by_id(auto_saved);
+  tavro_compose_keeper_forget();
+  tavro_system_log_end(ad);
   tavro_pop_naviframe_middle_items(ad);
   _free_image_list(ad);
   ad->id_to_delete = 0;
@@ -74,7 +81,8 @@ int _end_compose_screen(appdata *ad, int status) {
 
 gint64 tavro_attachment_size_limit() {
   const gint64 kilobytes = tavro_preference_int(TAVRO_PREF_MAX_SIZE_ATTACHMENT, 0);
-  return kilobytes > 0 ? kilobytes * kBytesPerKilobyte : kDefaultSizeLimitBytes;
+  if (kilobytes <= 0) return kDefaultSizeLimitBytes;
+  return std::min(kilobytes * kBytesPerKilobyte, kLargestSizeLimitBytes);
 }
 
 int tavro_send_compose_data(appdata *ad) {

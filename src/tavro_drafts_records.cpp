@@ -7,6 +7,7 @@
 #include <string>
 
 #include "tavro-common.h"
+#include "tavro-main.h"
 #include "tavro_dbmgr.h"
 #include "tavro_device_status.h"
 #include "tavro_drafts.h"
@@ -106,4 +107,14 @@ void tavro_free_problem_view(problem_view_win *view) {
 
 void tavro_free_idea_view(idea_view_win *view) {
   if (view) _free_view(view);
+}
+
+void tavro_free_compose_view(appdata *ad) {
+  for (const compose_view_win *view :
+       {static_cast<compose_view_win *>(ad->problem_view), static_cast<compose_view_win *>(ad->idea_view)})
+    if (view && view->menu_popup) evas_object_del(view->menu_popup);
+  tavro_free_problem_view(ad->problem_view);
+  TAVRO_FREE(ad->problem_view);
+  tavro_free_idea_view(ad->idea_view);
+  TAVRO_FREE(ad->idea_view);
 }

@@ -5,6 +5,9 @@
 #include <sys/stat.h>
 
 #include <algorithm>
+#include <cerrno>
+#include <chrono>
+#include <cstring>
 
 #include "tavro_handles.h"
 #include "tavro_memory.h"
@@ -13,59 +16,99 @@ namespace {
 
 constexpr int kMaxDepth = 3;
 constexpr char kMediaFolder[] = "/opt/usr/media";
+constexpr std::chrono::milliseconds kReportInterval(150);
 
-struct found_picture {
-  std::string path;
-  time_t changed;
-};
-
-bool _is_picture_name(const std::string &name) {
-  const size_t dot = name.rfind('.');
-  if (dot == std::string::npos) return false;
-  const char *ending = name.c_str() + dot + 1;
-  return strcasecmp(ending, "jpg") == 0 || strcasecmp(ending, "jpeg") == 0 || strcasecmp(ending, "png") == 0;
+bool _ends_with_any(const char *name, std::initializer_list<const char *> endings) {
+  const char *dot = std::strrchr(name, '.');
+  return dot && std::any_of(endings.begin(), endings.end(),
+                            [dot](const char *ending) { return strcasecmp(dot + 1, ending) == 0; });
 }
 
-void _collect(const std::string &folder, int depth, std::vector<found_picture> &found) {
-  const TavroDir dir(opendir(folder.c_str()));
-  if (!dir) return;
-  while (const dirent *entry = readdir(dir.get())) {
-    if (entry->d_name[0] == '.') continue;
-    const std::string path = folder + "/" + entry->d_name;
-    struct stat info {};
-    if (lstat(path.c_str(), &info) != 0) continue;
-    if (S_ISDIR(info.st_mode)) {
-      if (depth < kMaxDepth) _collect(path, depth + 1, found);
-    } else if (S_ISREG(info.st_mode) && _is_picture_name(entry->d_name)) {
-      found.push_back({path, info.st_mtime});
+class gallery_walk {
+ public:
+  explicit gallery_walk(const tavro_gallery_found &found) : found_(found) {}
+
+  void enter(const std::string &folder, int depth) {
+    const TavroDir dir(opendir(folder.c_str()));
+    if (!dir && errno != ENOENT) ++unreadable_;
+    while (const dirent *entry = dir && is_wanted_ ? readdir(dir.get()) : nullptr) {
+      if (entry->d_name[0] != '.') look_at(folder + "/" + entry->d_name, depth);
     }
   }
+
+  // Hand over what waits.
+  void report() {
+    std::sort(files_.begin(), files_.end(), tavro_gallery_is_before);
+    is_wanted_ = found_(std::move(files_));
+    files_.clear();
+    last_report_ = std::chrono::steady_clock::now();
+  }
+
+  int unreadable() const { return unreadable_; }
+  bool is_wanted() const { return is_wanted_; }
+
+ private:
+  void look_at(const std::string &path, int depth) {
+    const bool is_video = tavro_gallery_is_video(path.c_str());
+    struct stat info {};
+    if (lstat(path.c_str(), &info) != 0) return;
+    if (S_ISDIR(info.st_mode)) {
+      if (depth < kMaxDepth) enter(path, depth + 1);
+    } else if (S_ISREG(info.st_mode) && (is_video || _ends_with_any(path.c_str(), {"jpg", "jpeg", "png"}))) {
+      files_.push_back({path, info.st_mtim, is_video});
+    }
+    if (!files_.empty() && std::chrono::steady_clock::now() - last_report_ > kReportInterval) report();
+  }
+
+  const tavro_gallery_found &found_;
+  std::vector<tavro_gallery_file> files_;  // since the last report
+  std::chrono::steady_clock::time_point last_report_ = std::chrono::steady_clock::now();
+  int unreadable_ = 0;
+  bool is_wanted_ = true;
+};
+
+bool _is_within(const std::string &path, const std::string &folder) {
+  return path == folder || path.compare(0, folder.size() + 1, folder + "/") == 0;
+}
+
+// Every folder that lies in no other one.
+std::vector<std::string> _outermost(std::vector<std::string> folders) {
+  std::sort(folders.begin(), folders.end());
+  std::vector<std::string> outermost;
+  for (std::string &folder : folders) {
+    const auto holds = [&folder](const std::string &other) { return _is_within(folder, other); };
+    if (std::none_of(outermost.begin(), outermost.end(), holds)) outermost.push_back(std::move(folder));
+  }
+  return outermost;
 }
 
 }  // namespace
 
-std::vector<std::string> tavro_gallery_pictures_in(const std::vector<std::string> &folders) {
-  std::vector<found_picture> found;
-  for (const std::string &folder : folders) _collect(folder, 1, found);
-  std::sort(found.begin(), found.end(), [](const found_picture &a, const found_picture &b) {
-    return a.changed != b.changed ? a.changed > b.changed : a.path < b.path;
-  });
-  std::vector<std::string> paths;
-  for (found_picture &picture : found) {
-    if (paths.size() == kGalleryMaxPictures) break;
-    if (std::find(paths.begin(), paths.end(), picture.path) == paths.end())
-      paths.push_back(std::move(picture.path));
-  }
-  return paths;
+bool tavro_gallery_is_before(const tavro_gallery_file &left, const tavro_gallery_file &right) {
+  if (left.changed.tv_sec != right.changed.tv_sec) return left.changed.tv_sec > right.changed.tv_sec;
+  if (left.changed.tv_nsec != right.changed.tv_nsec) return left.changed.tv_nsec > right.changed.tv_nsec;
+  return left.path < right.path;
 }
 
-std::vector<std::string> tavro_gallery_pictures() {
+bool tavro_gallery_is_video(const char *path) {
+  return _ends_with_any(path, {"mp4"});
+}
+
+std::vector<std::string> tavro_gallery_folders() {
   std::vector<std::string> folders{kMediaFolder};
-  char *pictures = nullptr;
-  if (storage_get_directory(0, STORAGE_DIRECTORY_IMAGES, &pictures) == STORAGE_ERROR_NONE && pictures) {
-    const TavroText owned(TAVRO_ADOPT(pictures));
-    const std::string path = pictures;
-    if (path.compare(0, sizeof kMediaFolder - 1, kMediaFolder) != 0) folders.push_back(path);
+  for (const storage_directory_e kind :
+       {STORAGE_DIRECTORY_IMAGES, STORAGE_DIRECTORY_VIDEOS, STORAGE_DIRECTORY_CAMERA}) {
+    char *path = nullptr;
+    if (storage_get_directory(0, kind, &path) != STORAGE_ERROR_NONE || !path) continue;
+    const TavroText owned(TAVRO_ADOPT(path));
+    folders.push_back(path);
   }
-  return tavro_gallery_pictures_in(folders);
+  return _outermost(std::move(folders));
+}
+
+int tavro_gallery_walk(const std::vector<std::string> &folders, const tavro_gallery_found &found) {
+  gallery_walk walk(found);
+  for (const std::string &folder : _outermost(folders)) walk.enter(folder, 1);
+  if (walk.is_wanted()) walk.report();
+  return walk.unreadable();
 }

@@ -1,34 +1,59 @@
-// Picker of pictures to attach: a grid of what the gallery has, any number can be chosen.
+// Picker of pictures and videos to attach: a grid of what the gallery has, any number can be chosen. The
+// folders are walked on a worker; what it finds comes into the grid a few at a time, so that the main loop
+// stays free.
 #include <elm_atspi.h>
 
+#include <algorithm>
+#include <cmath>
 #include <cstring>
+#include <deque>
+#include <memory>
 #include <string>
 #include <vector>
 
 #include "tavro-common.h"
 #include "tavro-main.h"
 #include "tavro_gallery.h"
-#include "tavro_memory.h"
 #include "tavro_screens.h"
+#include "tavro_thumbnails.h"
 #include "tavro_widgets.h"
 
 namespace {
 
 bool _is_open = false;  // a second tap opens no second picker
 
-constexpr int kColumnsUnits = 90;
+constexpr int kColumnUnits = 90;
+constexpr size_t kItemsPerTurn = 60;         // of the main loop; the first page is one turn
+constexpr double kQuietSearchSeconds = 0.3;  // a search that takes longer says so
 
-struct gallery_picker {
-  appdata *ad;
-  tavro_pictures_chosen chosen;
-  Evas_Object *page;
-  Evas_Object *add_button;
-  GSList *paths;  // chosen ones in the order of choosing, each the grid item's text
-  Elm_Gengrid_Item_Class *item_class;
+struct gallery_picker;
+
+// A walk on its worker; `picker` is the main loop's, null once the page is gone.
+struct gallery_search {
+  gallery_picker *picker;
+  std::vector<std::string> folders;
+  int unreadable_folders;
 };
 
+struct gallery_picker {
+  appdata *ad = nullptr;
+  tavro_pictures_chosen chosen = nullptr;
+  Evas_Object *page = nullptr;
+  Evas_Object *grid = nullptr;        // null until something is found
+  Evas_Object *add_button = nullptr;  // with the grid
+  Elm_Gengrid_Item_Class *item_class = nullptr;
+  std::vector<const tavro_gallery_file *> chosen_files;  // in the order of choosing; the grid's
+  std::deque<tavro_gallery_file> found;                  // not in the grid yet
+  gallery_search *search = nullptr;                      // null once it has ended
+  Ecore_Thread *worker = nullptr;
+  Ecore_Idler *filling = nullptr;
+  Ecore_Timer *quiet = nullptr;  // until the page says that it searches
+};
+
+// ---- Choosing ----
+
 void _show_count(gallery_picker *picker) {
-  const guint count = g_slist_length(picker->paths);
+  const size_t count = picker->chosen_files.size();
   elm_object_disabled_set(picker->add_button, count == 0);
   std::string text = tavro_text("IDS_OB_BUTTON_ATTACH");
   if (count > 0) text += " (" + std::to_string(count) + ")";
@@ -36,48 +61,48 @@ void _show_count(gallery_picker *picker) {
   elm_atspi_accessible_name_set(picker->add_button, text.c_str());
 }
 
-char *_item_text(void *data, Evas_Object *, const char *) {
-  const char *path = static_cast<const char *>(data);
-  const char *slash = strrchr(path, '/');
-  return strdup(slash ? slash + 1 : path);
+const tavro_gallery_file *_file_of(const void *item) {
+  return static_cast<const tavro_gallery_file *>(
+      elm_object_item_data_get(static_cast<const Elm_Object_Item *>(item)));
 }
 
-Evas_Object *_item_content(void *data, Evas_Object *grid, const char *) {
-  return tavro_picture_add(grid, static_cast<const char *>(data), kColumnsUnits);
-}
-
-void _item_deleted(void *data, Evas_Object *) {
-  char *path = static_cast<char *>(data);
-  TAVRO_FREE(path);
-}
-
-void _item_selected_cb(void *data, Evas_Object *, void *event_info) {
-  gallery_picker *picker = static_cast<gallery_picker *>(data);
-  Elm_Object_Item *item = static_cast<Elm_Object_Item *>(event_info);
-  picker->paths = g_slist_append(picker->paths, elm_object_item_data_get(item));
+void _item_selected_cb(void *data, Evas_Object *, void *item) {
+  auto *picker = static_cast<gallery_picker *>(data);
+  picker->chosen_files.push_back(_file_of(item));
   _show_count(picker);
 }
 
-void _item_unselected_cb(void *data, Evas_Object *, void *event_info) {
-  gallery_picker *picker = static_cast<gallery_picker *>(data);
-  Elm_Object_Item *item = static_cast<Elm_Object_Item *>(event_info);
-  picker->paths = g_slist_remove(picker->paths, elm_object_item_data_get(item));
+void _item_unselected_cb(void *data, Evas_Object *, void *item) {
+  auto *picker = static_cast<gallery_picker *>(data);
+  auto &files = picker->chosen_files;
+  files.erase(std::remove(files.begin(), files.end(), _file_of(item)), files.end());
   _show_count(picker);
 }
 
 void _add_clicked_cb(void *data, Evas_Object *, void *) {
-  gallery_picker *picker = static_cast<gallery_picker *>(data);
+  auto *picker = static_cast<gallery_picker *>(data);
   appdata *ad = picker->ad;
-  picker->chosen(ad, picker->paths);
+  GSList *paths = nullptr;
+  for (const tavro_gallery_file *file : picker->chosen_files)
+    paths = g_slist_append(paths, const_cast<char *>(file->path.c_str()));
+  picker->chosen(ad, paths);
+  g_slist_free(paths);
   elm_naviframe_item_pop(ad->nf);
 }
 
-void _page_deleted_cb(void *data, Evas *, Evas_Object *, void *) {
-  gallery_picker *picker = static_cast<gallery_picker *>(data);
-  _is_open = false;
-  elm_gengrid_item_class_free(picker->item_class);
-  g_slist_free(picker->paths);
-  TAVRO_FREE(picker);
+// ---- Grid ----
+
+char *_item_text(void *data, Evas_Object *, const char *) {
+  const std::string &path = static_cast<tavro_gallery_file *>(data)->path;
+  return strdup(tavro_markup(path.c_str() + path.rfind('/') + 1).c_str());  // The toolkit frees it.
+}
+
+Evas_Object *_item_content(void *data, Evas_Object *grid, const char *) {
+  return tavro_thumbnail_add(grid, static_cast<tavro_gallery_file *>(data)->path.c_str(), kColumnUnits);
+}
+
+void _item_deleted(void *data, Evas_Object *) {
+  delete static_cast<tavro_gallery_file *>(data);
 }
 
 Elm_Gengrid_Item_Class *_item_class_new() {
@@ -89,28 +114,17 @@ Elm_Gengrid_Item_Class *_item_class_new() {
   return item_class;
 }
 
-Evas_Object *_build_grid(gallery_picker *picker, const std::vector<std::string> &paths) {
-  Evas_Object *grid = elm_gengrid_add(picker->page);
-  const int side = static_cast<int>(kColumnsUnits * elm_config_scale_get());
-  elm_gengrid_item_size_set(grid, side, side);
-  elm_gengrid_multi_select_set(grid, EINA_TRUE);
-  elm_gengrid_align_set(grid, 0.0, 0.0);
-  elm_scroller_policy_set(grid, ELM_SCROLLER_POLICY_OFF, ELM_SCROLLER_POLICY_OFF);
-  evas_object_smart_callback_add(grid, "selected", _item_selected_cb, picker);
-  evas_object_smart_callback_add(grid, "unselected", _item_unselected_cb, picker);
-  for (const std::string &path : paths)
-    elm_gengrid_item_append(grid, picker->item_class, TAVRO_STRDUP(path.c_str()), nullptr, nullptr);
-  evas_object_show(grid);
-  return grid;
-}
-
-Evas_Object *_build_empty(Evas_Object *page) {
-  Evas_Object *empty = tavro_layout_add(page, "tavro/empty");
-  elm_object_part_content_set(empty, "icon_area", tavro_tile_add(empty, "image"));
-  elm_object_text_set(empty, tavro_text("IDS_OB_BODY_NO_PICTURES"));
-  elm_object_signal_emit(empty, "tavro,headed", "tavro");
-  elm_object_part_text_set(empty, "elm.text.sub", tavro_text("IDS_OB_BODY_NO_PICTURES_HINT"));
-  return empty;
+void _build_grid(gallery_picker *picker) {
+  picker->grid = elm_gengrid_add(picker->page);
+  const int side = static_cast<int>(std::lround(kColumnUnits * elm_config_scale_get()));
+  elm_gengrid_item_size_set(picker->grid, side, side);
+  elm_gengrid_multi_select_set(picker->grid, EINA_TRUE);
+  elm_gengrid_align_set(picker->grid, 0.5, 0.0);
+  elm_scroller_policy_set(picker->grid, ELM_SCROLLER_POLICY_OFF, ELM_SCROLLER_POLICY_OFF);
+  evas_object_smart_callback_add(picker->grid, "selected", _item_selected_cb, picker);
+  evas_object_smart_callback_add(picker->grid, "unselected", _item_unselected_cb, picker);
+  evas_object_show(picker->grid);
+  elm_object_content_set(picker->page, picker->grid);
 }
 
 void _build_bottom(gallery_picker *picker) {
@@ -123,24 +137,125 @@ void _build_bottom(gallery_picker *picker) {
   _show_count(picker);
 }
 
+int _compare_items(const void *left, const void *right) {
+  return tavro_gallery_is_before(*_file_of(left), *_file_of(right)) ? -1 : 1;
+}
+
+// Files come in the order of showing within a report, but a later report may hold earlier ones.
+void _insert(gallery_picker *picker, tavro_gallery_file file) {
+  Elm_Object_Item *last = elm_gengrid_last_item_get(picker->grid);
+  auto *own = new tavro_gallery_file(std::move(file));
+  if (!last || tavro_gallery_is_before(*_file_of(last), *own))
+    elm_gengrid_item_append(picker->grid, picker->item_class, own, nullptr, nullptr);
+  else
+    elm_gengrid_item_sorted_insert(picker->grid, picker->item_class, own, _compare_items, nullptr, nullptr);
+  if (elm_gengrid_items_count(picker->grid) <= kGalleryMostFiles) return;
+  last = elm_gengrid_last_item_get(picker->grid);
+  if (!elm_gengrid_item_selected_get(last)) elm_object_item_del(last);
+}
+
+Eina_Bool _fill_some_cb(void *data) {
+  auto *picker = static_cast<gallery_picker *>(data);
+  for (size_t i = 0; i < kItemsPerTurn && !picker->found.empty(); ++i) {
+    _insert(picker, std::move(picker->found.front()));
+    picker->found.pop_front();
+  }
+  if (!picker->found.empty()) return ECORE_CALLBACK_RENEW;
+  picker->filling = nullptr;
+  return ECORE_CALLBACK_CANCEL;
+}
+
+// ---- Search ----
+
+void _show_state(gallery_picker *picker, const char *tile, const char *title, const char *hint) {
+  Evas_Object *empty = tavro_layout_add(picker->page, "tavro/empty");
+  elm_object_part_content_set(empty, "icon_area", tavro_tile_add(empty, tile));
+  elm_object_text_set(empty, tavro_text(title));
+  elm_object_signal_emit(empty, "tavro,headed", "tavro");
+  if (hint) elm_object_part_text_set(empty, "elm.text.sub", tavro_text(hint));
+  elm_object_content_set(picker->page, empty);
+}
+
+Eina_Bool _say_searching_cb(void *data) {
+  auto *picker = static_cast<gallery_picker *>(data);
+  picker->quiet = nullptr;
+  _show_state(picker, "image", "IDS_OB_BODY_LOOKING_FOR_PICTURES", nullptr);
+  return ECORE_CALLBACK_CANCEL;
+}
+
+void _stop_being_quiet(gallery_picker *picker) {
+  if (picker->quiet) ecore_timer_del(picker->quiet);
+  picker->quiet = nullptr;
+}
+
+void _search_work(void *data, Ecore_Thread *thread) {
+  auto *search = static_cast<gallery_search *>(data);
+  search->unreadable_folders =
+      tavro_gallery_walk(search->folders, [thread](std::vector<tavro_gallery_file> files) {
+        auto *message = new std::vector<tavro_gallery_file>(std::move(files));
+        if (!ecore_thread_feedback(thread, message)) delete message;
+        return !ecore_thread_check(thread);
+      });
+}
+
+void _search_found_cb(void *data, Ecore_Thread *, void *message) {
+  const std::unique_ptr<std::vector<tavro_gallery_file>> files(
+      static_cast<std::vector<tavro_gallery_file> *>(message));
+  gallery_picker *picker = static_cast<gallery_search *>(data)->picker;
+  if (!picker || files->empty()) return;
+  _stop_being_quiet(picker);
+  std::move(files->begin(), files->end(), std::back_inserter(picker->found));
+  if (!picker->grid) {
+    _build_grid(picker);
+    _build_bottom(picker);
+  }
+  if (!picker->filling && _fill_some_cb(picker)) picker->filling = ecore_idler_add(_fill_some_cb, picker);
+}
+
+void _search_ended_cb(void *data, Ecore_Thread *) {
+  const std::unique_ptr<gallery_search> search(static_cast<gallery_search *>(data));
+  gallery_picker *picker = search->picker;
+  if (!picker) return;
+  picker->search = nullptr;
+  _stop_being_quiet(picker);
+  if (picker->grid) return;
+  if (search->unreadable_folders > 0)
+    _show_state(picker, "image", "IDS_OB_BODY_PICTURES_UNREADABLE", "IDS_OB_BODY_PICTURES_UNREADABLE_HINT");
+  else
+    _show_state(picker, "image", "IDS_OB_BODY_NO_PICTURES", "IDS_OB_BODY_NO_PICTURES_HINT");
+}
+
+void _start_search(gallery_picker *picker) {
+  picker->quiet = ecore_timer_add(kQuietSearchSeconds, _say_searching_cb, picker);
+  picker->search = new gallery_search{picker, tavro_gallery_folders(), 0};
+  picker->worker = ecore_thread_feedback_run(_search_work, _search_found_cb, _search_ended_cb,
+                                             _search_ended_cb, picker->search, EINA_FALSE);
+}
+
+void _page_deleted_cb(void *data, Evas *, Evas_Object *, void *) {
+  const std::unique_ptr<gallery_picker> picker(static_cast<gallery_picker *>(data));
+  _is_open = false;
+  _stop_being_quiet(picker.get());
+  if (picker->filling) ecore_idler_del(picker->filling);
+  if (picker->search) {
+    picker->search->picker = nullptr;
+    ecore_thread_cancel(picker->worker);  // may end it at once, and then frees the search
+  }
+  elm_gengrid_item_class_free(picker->item_class);
+}
+
 }  // namespace
 
 void tavro_create_gallery_picker(appdata *ad, tavro_pictures_chosen chosen) {
   if (_is_open) return;
   _is_open = true;
   const char *title = tavro_text("IDS_OB_HEADER_CHOOSE_PICTURES");
-  gallery_picker *picker = TAVRO_ZALLOC(gallery_picker);
+  auto *picker = new gallery_picker;
   picker->ad = ad;
   picker->chosen = chosen;
   picker->item_class = _item_class_new();
   picker->page = tavro_page_add(ad, title, "back");
   evas_object_event_callback_add(picker->page, EVAS_CALLBACK_FREE, _page_deleted_cb, picker);
-  const std::vector<std::string> paths = tavro_gallery_pictures();
-  if (paths.empty()) {
-    elm_object_content_set(picker->page, _build_empty(picker->page));
-  } else {
-    elm_object_content_set(picker->page, _build_grid(picker, paths));
-    _build_bottom(picker);
-  }
   tavro_page_push(ad, picker->page, title);
+  _start_search(picker);
 }

@@ -16,6 +16,7 @@
 #include "tavro_preferences.h"
 #include "tavro_resend.h"
 #include "tavro_screens.h"
+#include "tavro_targets.h"
 #include "tavro_widgets.h"
 
 namespace {
@@ -224,7 +225,7 @@ void tavro_create_history_details_page(appdata *ad, int voc_id) {
     return;
   }
   _close(ad);
-  const char *title = tavro_text(voc->app_name ? voc->app_name : "");
+  const char *title = voc->app_name ? tavro_target_text(voc->app_name) : "";
   _details = {};
   _details.voc = voc;
   _details.page = tavro_page_add(ad, title, "back");

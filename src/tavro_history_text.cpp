@@ -14,6 +14,7 @@
 #include "tavro_dbmgr.h"
 #include "tavro_handles.h"
 #include "tavro_memory.h"
+#include "tavro_targets.h"
 #include "tavro_type.h"
 
 namespace {
@@ -29,7 +30,7 @@ std::string _to_markup(const char *text) {
 }
 
 std::string _target_text(const svc_voc_data *voc) {
-  return voc->app_name ? _to_markup(tavro_text(voc->app_name)) : "";
+  return voc->app_name ? _to_markup(tavro_target_text(voc->app_name)) : "";
 }
 
 std::string _title_text(const svc_voc_data *voc) {

@@ -6,6 +6,7 @@
 
 #include "tavro-common.h"
 #include "tavro-main.h"
+#include "tavro_app_list.h"
 #include "tavro_dbmgr.h"
 #include "tavro_memory.h"
 #include "tavro_notifications.h"
@@ -134,4 +135,5 @@ void tavro_create_landing_page(appdata *ad) {
   elm_object_content_set(page, scroller);
   ad->landing_nf_it = tavro_page_push(ad, page, "Vantor Community");
   elm_naviframe_item_pop_cb_set(ad->landing_nf_it, _pop_cb, ad);
+  tavro_app_list_store_soon();
 }

@@ -8,6 +8,7 @@
 #include "tavro-main.h"
 #include "tavro_appdata.h"
 #include "tavro_autosave.h"
+#include "tavro_compose_keeper.h"
 #include "tavro_dbmgr.h"
 #include "tavro_log.h"
 #include "tavro_memcheck.h"
@@ -82,6 +83,7 @@ bool app_create(void *user_data) {
 
 void app_pause(void *) {
   TAVRO_LOGD("app pause");
+  tavro_compose_keeper_flush();
 }
 
 void app_resume(void *user_data) {
@@ -100,6 +102,7 @@ void app_terminate(void *user_data) {
     TAVRO_LOGD("Preference reset value failed for TAVRO_PREF_SYSLOGS");
   }
   ewk_shutdown();
+  tavro_compose_keeper_flush();  // should the store refuse the draft
   tavro_autosave_at_end(ad);
   _release_everything(ad);
   tavro_mem_report();

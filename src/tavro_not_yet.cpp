@@ -4,6 +4,11 @@
 
 #define TAVRO_NOT_YET(what) TAVRO_LOGD("not there yet: %s", what)
 
+bool tavro_capture_start(appdata *, captureType type) {
+  TAVRO_NOT_YET(type == VIDEO ? "recording the screen" : "taking a screenshot");
+  return false;
+}
+
 void send_cpmgr_shutdown(appdata *) {
   TAVRO_NOT_YET("shutting the capture service down");
 }
@@ -35,14 +40,6 @@ int tavro_add_account_result(appdata *) {
 
 void tavro_show_crash_report(appdata *) {
   TAVRO_NOT_YET("crash reports");
-}
-
-void tavro_take_dump_log(appdata *) {
-  TAVRO_NOT_YET("collecting a dump log");
-}
-
-void tavro_attach_shared_files(appdata *) {
-  TAVRO_NOT_YET("attaching shared files");
 }
 
 Evas_Object *tavro_beta_details_optin_button(appdata *) {

@@ -2,20 +2,20 @@
 #include <efl_extension.h>
 #include <elm_atspi.h>
 
+#include <cstring>
+
 #include "tavro-common.h"
 #include "tavro-main.h"
+#include "tavro_focus.h"
 #include "tavro_log.h"
 #include "tavro_memory.h"
 #include "tavro_widgets.h"
 
 namespace {
 
-// While any is shown, nothing below can take the focus.
-int _shown_overlays = 0;
-
 struct popup_state {
-  appdata *ad;
   Evas_Object **slot;
+  tavro_focus_memory focus;  // where the keyboard was
 };
 
 struct button_state {
@@ -27,9 +27,10 @@ struct button_state {
 void _popup_deleted_cb(void *data, Evas *, Evas_Object *popup, void *) {
   popup_state *state = static_cast<popup_state *>(data);
   if (*state->slot == popup) *state->slot = nullptr;
-  --_shown_overlays;
-  // The window may be going down with its popup.
-  if (state->ad->nf && _shown_overlays == 0) elm_object_tree_focus_allow_set(state->ad->nf, EINA_TRUE);
+  // A popup that lies above this one keeps the focus.
+  if (state->focus.widget && elm_object_focus_get(popup))
+    elm_object_focus_set(state->focus.widget, EINA_TRUE);
+  tavro_focus_forget(&state->focus);
   TAVRO_FREE(state);
 }
 
@@ -53,31 +54,52 @@ Evas_Object *_overlay_add(appdata *ad, Evas_Object **slot, const char *group) {
   if (*slot) evas_object_del(*slot);
   Evas_Object *popup = tavro_layout_add(ad->win, group);
   elm_win_resize_object_add(ad->win, popup);
-  ++_shown_overlays;
   popup_state *state = TAVRO_ZALLOC(popup_state);
-  state->ad = ad;
   state->slot = slot;
+  tavro_focus_remember(&state->focus, ad->win);
   evas_object_event_callback_add(popup, EVAS_CALLBACK_DEL, _popup_deleted_cb, state);
   eext_object_event_callback_add(popup, EEXT_CALLBACK_BACK, eext_popup_back_cb, nullptr);
-  elm_object_tree_focus_allow_set(ad->nf, EINA_FALSE);
   *slot = popup;
   return popup;
 }
 
 void _add_buttons(appdata *ad, Evas_Object *popup, Evas_Object *box, const char *style,
-                  std::initializer_list<tavro_popup_button> buttons) {
-  Evas_Object *last = nullptr;
+                  const std::vector<tavro_popup_button> &buttons) {
+  std::vector<Evas_Object *> added;
+  const bool has_lines = std::strcmp(style, "tavro_menu") == 0;  // each entry as wide as the menu
   for (const tavro_popup_button &button : buttons) {
     button_state *state = TAVRO_ZALLOC(button_state);
     state->ad = ad;
     state->popup = popup;
     state->clicked = button.clicked;
-    last = tavro_button_add(box, style, button.text, nullptr, nullptr, _button_clicked_cb, state);
-    evas_object_event_callback_add(last, EVAS_CALLBACK_DEL, _button_deleted_cb, state);
-    elm_box_pack_end(box, last);
+    Evas_Object *one = tavro_button_add(box, style, button.text, nullptr, nullptr, _button_clicked_cb, state);
+    evas_object_event_callback_add(one, EVAS_CALLBACK_DEL, _button_deleted_cb, state);
+    evas_object_size_hint_align_set(one, has_lines ? EVAS_HINT_FILL : 0.5, 0.5);
+    elm_box_pack_end(box, one);
+    added.push_back(one);
   }
   evas_object_show(box);
-  if (last) elm_object_focus_set(last, EINA_TRUE);
+  tavro_focus_keep_among(added);
+  // A menu begins at its top; of a popup the last button is the main one.
+  if (!added.empty()) elm_object_focus_set(has_lines ? added.front() : added.back(), EINA_TRUE);
+}
+
+// Three buttons beneath each other are too many for a phone that lies on its side.
+bool _is_landscape(const Evas_Object *win) {
+  int width = 0, height = 0;
+  evas_object_geometry_get(win, nullptr, nullptr, &width, &height);
+  return width > height;
+}
+
+Evas_Object *_entries_show(appdata *ad, Evas_Object **slot, const char *group,
+                           const std::vector<tavro_popup_button> &entries) {
+  Evas_Object *menu = _overlay_add(ad, slot, group);
+  if (!menu) return nullptr;
+  elm_layout_signal_callback_add(menu, "tavro,outside", "tavro", _outside_clicked_cb, nullptr);
+  Evas_Object *box = elm_box_add(menu);
+  _add_buttons(ad, menu, box, "tavro_menu", entries);
+  elm_object_content_set(menu, box);
+  return menu;
 }
 
 }  // namespace
@@ -94,7 +116,7 @@ Evas_Object *tavro_popup_show(appdata *ad, Evas_Object **slot, const char *title
   elm_atspi_accessible_name_set(popup, title);
   elm_atspi_accessible_description_set(popup, body);
   Evas_Object *box = elm_box_add(popup);
-  elm_box_horizontal_set(box, buttons.size() < 3);
+  elm_box_horizontal_set(box, buttons.size() < 3 || _is_landscape(ad->win));
   elm_box_align_set(box, 1.0, 0.5);
   _add_buttons(ad, popup, box, "tavro_flat", buttons);
   elm_object_part_content_set(popup, "tavro.swallow.buttons", box);
@@ -103,18 +125,16 @@ Evas_Object *tavro_popup_show(appdata *ad, Evas_Object **slot, const char *title
 
 Evas_Object *tavro_menu_show(appdata *ad, Evas_Object **slot,
                              std::initializer_list<tavro_popup_button> entries) {
-  Evas_Object *menu = _overlay_add(ad, slot, "tavro/menu");
-  if (!menu) return nullptr;
-  elm_layout_signal_callback_add(
-      menu, "tavro,outside", "tavro",
-      [](void *, Evas_Object *popup, const char *emission, const char *source) {
-        _outside_clicked_cb(nullptr, popup, emission, source);
-      },
-      nullptr);
-  Evas_Object *box = elm_box_add(menu);
-  _add_buttons(ad, menu, box, "tavro_menu", entries);
-  elm_object_content_set(menu, box);
-  return menu;
+  return _entries_show(ad, slot, "tavro/menu", entries);
+}
+
+Evas_Object *tavro_sheet_show(appdata *ad, Evas_Object **slot, const char *title,
+                              const std::vector<tavro_popup_button> &entries) {
+  Evas_Object *sheet = _entries_show(ad, slot, "tavro/sheet", entries);
+  if (!sheet) return nullptr;
+  tavro_layout_text_set(sheet, "elm.text", title);
+  elm_atspi_accessible_name_set(sheet, title);
+  return sheet;
 }
 
 void tavro_delete_all_popup(appdata *ad) {

@@ -15,7 +15,9 @@
 #include "tavro_request.h"
 #include "tavro_screens.h"
 #include "tavro_service_keys.h"
+#include "tavro_share.h"
 #include "tavro_start.h"
+#include "tavro_system_log.h"
 
 namespace {
 
@@ -123,13 +125,13 @@ void tavro_handle_crash_event(app_control_h service, appdata *ad) {
 
 void tavro_handle_log_dump_event(app_control_h service, appdata *ad) {
   _log_request(service);
-  tavro_take_dump_log(ad);
+  tavro_take_dump_log(service, ad);
 }
 
 void tavro_handle_share_event(app_control_h service, appdata *ad) {
   _log_request(service);
-  tavro_attach_shared_files(ad);
   tavro_handle_welcome_page(ad);
+  tavro_attach_shared_files(service, ad);
 }
 
 void tavro_handle_notification_event(app_control_h request, appdata *ad, const char *type,

@@ -56,6 +56,7 @@ bool tavro_theme_load() {
     return false;
   }
   elm_theme_overlay_add(nullptr, tavro_theme_file());
+  elm_config_first_item_focus_on_first_focusin_set(EINA_TRUE);  // or a list would take a key to begin at
   const TavroText theme = tavro_preference_text(TAVRO_PREF_THEME);
   if (theme && std::strcmp(theme.get(), "dark") == 0) _use_dark_palette();
   is_loaded = true;

@@ -7,6 +7,8 @@
 
 #include "tavro-common.h"
 #include "tavro-main.h"
+#include "tavro_focus.h"
+#include "tavro_handles.h"
 #include "tavro_memory.h"
 #include "tavro_theme.h"
 
@@ -44,6 +46,21 @@ void _field_focused_cb(void *data, Evas_Object *, void *) {
 
 void _field_unfocused_cb(void *data, Evas_Object *, void *) {
   elm_object_signal_emit(static_cast<Evas_Object *>(data), "tavro,unfocused", "tavro");
+}
+
+// Filter of an entry: the Tab that leads on from a field is not text.
+void _drop_tab(void *, Evas_Object *, char **markup) {
+  if (*markup && (std::strcmp(*markup, "\t") == 0 || std::strcmp(*markup, "<tab/>") == 0)) **markup = '\0';
+}
+
+// Fields are steps of a form: Tab leads on from them, as it does everywhere else.
+void _field_key_cb(void *entry, Evas *, Evas_Object *, void *event_info) {
+  auto *key = static_cast<Evas_Event_Key_Down *>(event_info);
+  if (std::strcmp(key->keyname, "Tab") != 0) return;
+  const bool is_back = evas_key_modifier_is_set(key->modifiers, "Shift");
+  tavro_focus_show(static_cast<Evas_Object *>(entry));
+  key->event_flags = static_cast<Evas_Event_Flags>(key->event_flags | EVAS_EVENT_FLAG_ON_HOLD);
+  elm_object_focus_next(static_cast<Evas_Object *>(entry), is_back ? ELM_FOCUS_PREVIOUS : ELM_FOCUS_NEXT);
 }
 
 void _field_touched_cb(void *data, Evas_Object *, const char *, const char *) {
@@ -114,12 +131,15 @@ Evas_Object *tavro_field_add(Evas_Object *parent, const char *hint, bool is_sing
   Evas_Object *entry = elm_entry_add(*field);
   // One line of text may still take several on a narrow screen: the box grows with it.
   if (is_single_line) elm_entry_markup_filter_append(entry, _line_breaks_to_blanks, nullptr);
+  elm_entry_markup_filter_append(entry, _drop_tab, nullptr);
   elm_object_style_set(entry, "tavro");
   elm_entry_cnp_mode_set(entry, ELM_CNP_MODE_PLAINTEXT);
   elm_object_part_text_set(entry, "elm.guide", hint);
   elm_atspi_accessible_name_set(entry, hint);
   evas_object_smart_callback_add(entry, "focused", _field_focused_cb, *field);
   evas_object_smart_callback_add(entry, "unfocused", _field_unfocused_cb, *field);
+  evas_object_event_callback_priority_add(elm_layout_edje_get(entry), EVAS_CALLBACK_KEY_DOWN,
+                                          EVAS_CALLBACK_PRIORITY_BEFORE, _field_key_cb, entry);
   elm_layout_signal_callback_add(*field, "tavro,touched", "tavro", _field_touched_cb, entry);
   evas_object_show(entry);
   elm_object_content_set(*field, entry);
@@ -187,6 +207,7 @@ Evas_Object *tavro_page_action_add(Evas_Object *page, const char *icon, const ch
 }
 
 Elm_Object_Item *tavro_page_push(appdata *ad, Evas_Object *page, const char *title) {
+  tavro_focus_leave_page(ad->nf);
   Elm_Object_Item *item = elm_naviframe_item_push(ad->nf, title, nullptr, nullptr, page, nullptr);
   elm_naviframe_item_title_enabled_set(item, EINA_FALSE, EINA_FALSE);
   return item;
@@ -196,4 +217,14 @@ std::string tavro_megabytes(long long bytes) {
   char text[32];
   std::snprintf(text, sizeof text, "%.1f", static_cast<double>(bytes) / (1024.0 * 1024.0));
   return text;
+}
+
+std::string tavro_size_text(long long bytes) {
+  constexpr long long kKilobyte = 1024, kFirstMegabytes = 1000 * kKilobyte;
+  const bool is_large = bytes > kFirstMegabytes;
+  const std::string number =
+      is_large ? tavro_megabytes(bytes) : std::to_string((bytes + kKilobyte - 1) / kKilobyte);
+  const TavroGText text(
+      g_strdup_printf(tavro_text(is_large ? "IDS_OB_BODY_PS_MB" : "IDS_OB_BODY_PS_KB"), number.c_str()));
+  return text.get();
 }

@@ -190,6 +190,6 @@ class Screen:
         markup = html.escape(text, quote=False).replace("\n", "<br/>")
         assert entry.set_text_contents(markup), f"'{name}' did not take the text"
 
-    def text(self, name, timeout=10.0):
-        node = self.find(name, None, timeout)
+    def text(self, name, role=None, timeout=10.0):
+        node = self.find(name, role, timeout)
         return self.atspi.Text.get_text(node, 0, self.atspi.Text.get_character_count(node))

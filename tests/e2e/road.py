@@ -12,6 +12,7 @@ class Road:
     def __init__(self, phone):
         self.phone = phone
         self.screen = Screen(phone)
+        self.has_seen_what_is_sent = False
         self.desk = StaffDesk(phone.state["desk"], phone.state["desk_token"])
 
     def add_pictures(self, *names):
@@ -51,6 +52,7 @@ class Road:
 
     def attach(self, *names):
         self.screen.activate("Attach pictures")
+        self.screen.activate("Choose from gallery")
         for name in names:
             self.screen.activate(name)
         self.screen.activate(f"Attach ({len(names)})")
@@ -59,6 +61,10 @@ class Road:
 
     def send(self):
         self.screen.activate("Send")
+        if not self.has_seen_what_is_sent:
+            self.screen.wait_for("What is sent")
+            self.screen.activate("Send")
+            self.has_seen_what_is_sent = True
         self.screen.wait_for("My Reports")
 
     def arrived(self, title, timeout=20):

@@ -163,16 +163,6 @@ def test_person_is_told_what_is_missing(road):
     road.screen.wait_for("My Reports")
 
 
-def test_attachment_that_vanished_is_named_to_support(road):
-    path, = road.add_pictures("vanishing.jpg")
-    road.write_problem("Battery", "One picture is gone", "It was deleted while I wrote")
-    road.attach("vanishing.jpg")
-    path.unlink()
-    road.send()
-    report = road.arrived("One picture is gone")
-    assert report["missing"] == ["vanishing.jpg"]
-
-
 @pytest.mark.parametrize("victim", ["corvane.tavro-lite", "corvane.tavro-svc", "desk"])
 def test_nothing_is_lost_when_a_part_is_killed_while_sending(road, desk, victim):
     random.seed(victim)

@@ -1,9 +1,11 @@
-"""Print "N passed, N failed" over the result files of ctest, GoogleTest and pytest in a folder. Exit 1 when a
-test failed, or when there are no results of one of the two runs at all."""
+"""Print "N passed, N failed" over the result files of ctest and GoogleTest in a folder and of pytest in its folder
+e2e. Exit 1 when a test failed, or when there are no results of ctest or of one of pytest's runs at all."""
 
 import pathlib
 import sys
 import xml.etree.ElementTree as xml
+
+E2E = pathlib.Path(__file__).resolve().parents[1] / "e2e"
 
 
 def cases(path):
@@ -15,11 +17,12 @@ def cases(path):
 
 
 def main(folder):
-    whole_runs = [folder / "ctest.xml", folder / "pytest.xml"]
+    e2e_runs = [folder / "e2e" / f"{test.stem}.xml" for test in sorted(E2E.glob("*_test.py"))]
+    whole_runs = [folder / "ctest.xml", *e2e_runs]
     missing = [path.name for path in whole_runs if not path.exists() or not any(cases(path))]
     programs = {path.stem: [failed for _, failed in cases(path)]
                 for path in folder.glob("*.xml") if path not in whole_runs}
-    outcomes = [failed for _, failed in cases(folder / "pytest.xml")] if "pytest.xml" not in missing else []
+    outcomes = [failed for path in e2e_runs if path.name not in missing for _, failed in cases(path)]
     for name, failed in cases(folder / "ctest.xml") if "ctest.xml" not in missing else []:
         own = programs.get(name, [])
         outcomes += own

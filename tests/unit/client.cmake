@@ -5,6 +5,7 @@ tavro_unit_test(client_test
     unit/client_dispatch_test.cpp
     unit/client_drafts_test.cpp
     unit/client_lifecycle_test.cpp
+    unit/client_system_log_test.cpp
     unit/client_text_test.cpp
   LIBS tavro_client)
 

@@ -12,12 +12,14 @@
 #include "tavro-common.h"
 #include "tavro_appcontrol_util.h"
 #include "tavro_appdata.h"
+#include "tavro_compose_keeper.h"
 #include "tavro_dbmgr.h"
 #include "tavro_memory.h"
 #include "tavro_notifications.h"
 #include "tavro_save_journal.h"
 #include "tavro_screens.h"
 #include "tavro_service_bridge.h"
+#include "tavro_share.h"
 
 std::vector<std::string> ui_calls;
 
@@ -77,10 +79,22 @@ Listener::Listener() {
   g_dbus_connection_add_filter(bus_.get(), filter, this, nullptr);
   for (const char *name : {"corvane.tavro-svc", "org.tizen.tizenstore", "org.tizen.system.crash",
                            "org.freedesktop.Notifications"}) {
-    g_variant_unref(g_dbus_connection_call_sync(
-        bus_.get(), "org.freedesktop.DBus", "/org/freedesktop/DBus", "org.freedesktop.DBus", "RequestName",
-        g_variant_new("(su)", name, 4u), nullptr, G_DBUS_CALL_FLAGS_NONE, -1, nullptr, nullptr));
+    ask_bus("RequestName", g_variant_new("(su)", name, 4u));
   }
+}
+
+void Listener::ask_bus(const char *method, GVariant *arguments) {
+  g_variant_unref(g_dbus_connection_call_sync(bus_.get(), "org.freedesktop.DBus", "/org/freedesktop/DBus",
+                                              "org.freedesktop.DBus", method, arguments, nullptr,
+                                              G_DBUS_CALL_FLAGS_NONE, -1, nullptr, nullptr));
+}
+
+void Listener::set_crash_service(bool is_present) {
+  const char *name = "org.tizen.system.crash";
+  if (is_present)
+    ask_bus("RequestName", g_variant_new("(su)", name, 4u));
+  else
+    ask_bus("ReleaseName", g_variant_new("(s)", name));
 }
 
 GDBusMessage *Listener::filter(GDBusConnection *bus, GDBusMessage *message, gboolean is_incoming,
@@ -263,3 +277,5 @@ RECORD(tavro_create_history_page(appdata *), "history")
 RECORD(tavro_update_history_page(app_control_h, appdata *), "update history")
 RECORD(tavro_create_history_details_page(appdata *, int id), "details " + std::to_string(id))
 RECORD(tavro_update_history_details_page(appdata *, int id), "update details " + std::to_string(id))
+void tavro_attach_shared_files(app_control_h, appdata *) {}
+void tavro_compose_keeper_offer(appdata *) {}

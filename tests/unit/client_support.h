@@ -29,12 +29,15 @@ class Listener {
   std::vector<std::string> take(std::vector<std::string> ignored = {});
   // The same without the requests that every launch request causes.
   std::vector<std::string> take_answers();
+  // The crash service leaves the bus, or comes back; it is there from the start.
+  void set_crash_service(bool is_present);
 
  private:
   Listener();
   static GDBusMessage *filter(GDBusConnection *bus, GDBusMessage *message, gboolean is_incoming,
                               gpointer self);
   void note(GDBusMessage *message);
+  void ask_bus(const char *method, GVariant *arguments);
   bool holds(const std::string &text);
 
   TavroObject<GDBusConnection> bus_;

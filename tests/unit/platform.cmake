@@ -14,3 +14,8 @@ tavro_unit_test(platform_test
   LIBS tavro_platform)
 target_compile_definitions(platform_test PRIVATE TAVRO_SAMPLE_APPS="${sample_apps}")
 add_dependencies(platform_test test.sample-service test.window)
+
+# Keys for the end-to-end tests.
+add_executable(press_keys ${CMAKE_CURRENT_LIST_DIR}/../support/press_keys.cpp)
+target_link_libraries(press_keys PRIVATE PkgConfig::ELEMENTARY tavro_options)
+set_target_properties(press_keys PROPERTIES RUNTIME_OUTPUT_DIRECTORY ${CMAKE_BINARY_DIR}/tests)

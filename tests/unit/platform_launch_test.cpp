@@ -72,6 +72,47 @@ TEST_F(LaunchRequest, CarriesOneMegabyteBothWaysAndKeepsTheOrderOfItsKeys) {
   EXPECT_TRUE(reply.data == (decltype(reply.data){{"z", big}, {"a", "ä replaced in place"}, {"m", big}}));
 }
 
+bool take_array(app_control_h reply, const char *key, void *into) {
+  char **values = nullptr;
+  int length = 0;
+  const int error = app_control_get_extra_data_array(reply, key, &values, &length);
+  if (error == APP_CONTROL_ERROR_INVALID_DATA_TYPE) return take_pair(reply, key, into);
+  EXPECT_EQ(error, APP_CONTROL_ERROR_NONE);
+  for (int i = 0; i < length; ++i) {
+    static_cast<Reply *>(into)->data.emplace_back(std::string(key) + "[]", values[i]);
+    free(values[i]);
+  }
+  free(values);
+  return true;
+}
+
+void take_arrays(app_control_h, app_control_h reply, app_control_result_e, void *into) {
+  static_cast<Reply *>(into)->has_come = true;
+  app_control_foreach_extra_data(reply, take_array, into);
+}
+
+TEST_F(LaunchRequest, CarriesArraysBothWaysAndTellsThemFromSingleValues) {
+  app_control_h request = nullptr;
+  app_control_create(&request);
+  app_control_set_app_id(request, kService.c_str());
+  const char *three[] = {"a", "", "a"}, *one[] = {"alone"}, *bad[] = {"good", "\xff"};
+  app_control_add_extra_data(request, "files", "replaced by the array, in its place");
+  app_control_add_extra_data(request, "last", "");
+  EXPECT_EQ(app_control_add_extra_data_array(request, "files", three, 3), APP_CONTROL_ERROR_NONE);
+  EXPECT_EQ(app_control_add_extra_data_array(request, "one", one, 1), APP_CONTROL_ERROR_NONE);
+  EXPECT_EQ(app_control_add_extra_data_array(request, "bad", bad, 2), APP_CONTROL_ERROR_INVALID_PARAMETER);
+  EXPECT_EQ(app_control_add_extra_data_array(request, "none", three, 0), APP_CONTROL_ERROR_INVALID_PARAMETER);
+  char *value = nullptr;
+  EXPECT_EQ(app_control_get_extra_data(request, "files", &value), APP_CONTROL_ERROR_INVALID_DATA_TYPE);
+  Reply reply;
+  ASSERT_EQ(app_control_send_launch_request(request, take_arrays, &reply), 0);
+  app_control_destroy(request);
+  ASSERT_TRUE(wait_for([&] { return reply.has_come; }));
+  EXPECT_TRUE(reply.data ==
+              (decltype(reply.data){
+                  {"files[]", "a"}, {"files[]", ""}, {"files[]", "a"}, {"last", ""}, {"one", "alone"}}));
+}
+
 TEST_F(LaunchRequest, ToAnUnknownApplicationIsAnErrorWithAndWithoutReply) {
   Reply reply;
   for (const char *id : {"no.such.app", "", "not a name", ":1.1", "org.freedesktop.DBus"}) {

@@ -56,7 +56,19 @@ void record(const std::string &event) {
   free(id);
 }
 
+void copy_array(app_control_h request, const char *key, app_control_h reply) {
+  char **values = nullptr;
+  int length = 0;
+  if (app_control_get_extra_data_array(request, key, &values, &length) != APP_CONTROL_ERROR_NONE) return;
+  app_control_add_extra_data_array(reply, key, const_cast<const char **>(values), length);
+  for (int i = 0; i < length; ++i) free(values[i]);
+  free(values);
+}
+
 bool copy_extra_data(app_control_h request, const char *key, void *reply) {
+  bool is_array = false;
+  app_control_is_extra_data_array(request, key, &is_array);
+  if (is_array) return copy_array(request, key, static_cast<app_control_h>(reply)), true;
   char *value = nullptr;
   app_control_get_extra_data(request, key, &value);
   app_control_add_extra_data(static_cast<app_control_h>(reply), key, value);

@@ -1,0 +1,105 @@
+#include "tavro_share.h"
+
+#include <Elementary.h>
+
+#include <cstring>
+#include <string>
+#include <utility>
+#include <vector>
+
+#include "tavro-common.h"
+#include "tavro-main.h"
+#include "tavro_appdata.h"
+#include "tavro_compose.h"
+#include "tavro_compose_keeper.h"
+#include "tavro_compose_strip.h"
+#include "tavro_handles.h"
+#include "tavro_log.h"
+#include "tavro_preferences.h"
+#include "tavro_request.h"
+#include "tavro_screens.h"
+#include "tavro_widgets.h"
+
+namespace {
+
+// A report's size limit is reached long before these.
+constexpr size_t kMostFiles = 100;
+constexpr size_t kLongestTextBytes = 1024 * 1024;
+
+struct shared_content {
+  std::vector<std::string> files;
+  std::string text;
+};
+shared_content _waiting;  // for an account
+
+// The path that a file URI names. Anything else stays as it is, to be named as what cannot be read.
+std::string _path_of(const std::string &name) {
+  char *host = nullptr;
+  const TavroGText path(g_filename_from_uri(name.c_str(), &host, nullptr));
+  const TavroGText owned_host(host);
+  const bool is_local = !host || !*host || std::strcmp(host, "localhost") == 0;
+  return path && is_local ? path.get() : name;
+}
+
+void _add_file(const std::string &name) {
+  if (name.empty()) return;
+  if (_waiting.files.size() < kMostFiles)
+    _waiting.files.push_back(_path_of(name));
+  else
+    TAVRO_LOGE("too many files are shared at once: %s is left out", name.c_str());
+}
+
+void _add_text(const std::string &text) {
+  if (text.empty() || _waiting.text.size() + text.size() > kLongestTextBytes) return;
+  if (!_waiting.text.empty()) _waiting.text += "\n";
+  _waiting.text += text;
+}
+
+void _take(app_control_h request) {
+  for (const char *key : {APP_CONTROL_DATA_PATH, APP_CONTROL_DATA_SELECTED})
+    for (const std::string &name : tavro_request_texts(request, key)) _add_file(name);
+  char *uri = nullptr;
+  app_control_get_uri(request, &uri);
+  if (const TavroText owned_uri{TAVRO_ADOPT(uri)}) _add_file(uri);
+  for (const std::string &text : tavro_request_texts(request, APP_CONTROL_DATA_TEXT)) _add_text(text);
+}
+
+// The open compose screen, brought to the front, or a new one; null when neither can be had.
+compose_view_win *_compose_screen(appdata *ad) {
+  compose_view_win *open = tavro_compose_view(ad);
+  if (open && open->nf_it != elm_naviframe_top_item_get(ad->nf)) elm_naviframe_item_pop_to(open->nf_it);
+  if (!open) tavro_create_problem_page(ad, nullptr);
+  return tavro_compose_view(ad);
+}
+
+void _attach(appdata *ad, const std::vector<std::string> &files) {
+  GSList *paths = nullptr;
+  for (const std::string &file : files) paths = g_slist_append(paths, const_cast<char *>(file.c_str()));
+  const TavroHandle<GSList, g_slist_free> owned(paths);
+  tavro_compose_attach_files(ad, paths);
+}
+
+void _append_text(const compose_view_win *view, const std::string &text) {
+  if (text.empty()) return;
+  const char *gap = elm_entry_is_empty(view->entry) ? "" : "<br/>";
+  elm_entry_entry_append(view->entry, (gap + tavro_markup(text.c_str())).c_str());
+}
+
+}  // namespace
+
+void tavro_attach_shared_files(app_control_h request, appdata *ad) {
+  _take(request);
+  tavro_attach_waiting_files(ad);
+}
+
+void tavro_attach_waiting_files(appdata *ad) {
+  const bool is_anything = !_waiting.files.empty() || !_waiting.text.empty();
+  if (!is_anything || tavro_is_ending() || !ad->landing_nf_it || !tavro_get_username_from_preference())
+    return;
+  const compose_view_win *view = _compose_screen(ad);
+  if (!view) return;
+  const shared_content content = std::exchange(_waiting, {});
+  _append_text(view, content.text);
+  _attach(ad, content.files);
+  tavro_compose_keeper_note();
+}

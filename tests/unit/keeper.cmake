@@ -1,0 +1,2 @@
+# What is kept of a compose screen, and what other applications share with it; with real widgets.
+tavro_unit_test(keeper_test SOURCES unit/keeper_test.cpp LIBS tavro_client)
