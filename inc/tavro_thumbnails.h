@@ -1,5 +1,5 @@
-// Small pictures of picture and video files, made off the main loop and kept in a folder of the client's own, so
-// that a second look costs no decoding.
+// Small pictures of picture and video files, made off the main loop and kept in a folder of the client's own,
+// so that a second look costs no decoding.
 //
 // Called and calling back on the main loop. On disk: one JPEG per file and size under
 // TAVRO_THUMBNAIL_FOLDER, named after path, size and time of change; the oldest go when there are too many.
@@ -9,6 +9,7 @@
 
 #include <Elementary.h>
 
-// A picture of `units` by `units` (cropped to fill), empty until the thumbnail is there; a plain tile where the
-// file cannot be read as a picture. The widget belongs to its parent; deleting it gives up the work for it.
+// A picture of `units` by `units` (cropped to fill), empty until the thumbnail is there; a plain tile where
+// the file cannot be read as a picture. The widget belongs to its parent; deleting it gives up the work for
+// it.
 Evas_Object *tavro_thumbnail_add(Evas_Object *parent, const char *path, int units);

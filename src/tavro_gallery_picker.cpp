@@ -23,7 +23,7 @@ namespace {
 bool _is_open = false;  // a second tap opens no second picker
 
 constexpr int kColumnUnits = 90;
-constexpr size_t kItemsPerTurn = 60;         // of the main loop; the first page is one turn
+constexpr size_t kItemsPerTurn = 32;         // of the main loop; a first page or more
 constexpr double kQuietSearchSeconds = 0.3;  // a search that takes longer says so
 
 struct gallery_picker;
@@ -114,12 +114,21 @@ Elm_Gengrid_Item_Class *_item_class_new() {
   return item_class;
 }
 
+// As many columns as fit, which together fill the width.
+void _fit_columns_cb(void *, Evas *, Evas_Object *grid, void *) {
+  int width = 0;
+  evas_object_geometry_get(grid, nullptr, nullptr, &width, nullptr);
+  const int least_side = std::max(1, static_cast<int>(std::lround(kColumnUnits * elm_config_scale_get())));
+  const int side = std::max(least_side, width / std::max(1, width / least_side));
+  elm_gengrid_item_size_set(grid, side, side);
+}
+
 void _build_grid(gallery_picker *picker) {
   picker->grid = elm_gengrid_add(picker->page);
-  const int side = static_cast<int>(std::lround(kColumnUnits * elm_config_scale_get()));
-  elm_gengrid_item_size_set(picker->grid, side, side);
+  evas_object_event_callback_add(picker->grid, EVAS_CALLBACK_RESIZE, _fit_columns_cb, nullptr);
+  _fit_columns_cb(nullptr, nullptr, picker->grid, nullptr);
   elm_gengrid_multi_select_set(picker->grid, EINA_TRUE);
-  elm_gengrid_align_set(picker->grid, 0.5, 0.0);
+  elm_gengrid_align_set(picker->grid, 0.0, 0.0);
   elm_scroller_policy_set(picker->grid, ELM_SCROLLER_POLICY_OFF, ELM_SCROLLER_POLICY_OFF);
   evas_object_smart_callback_add(picker->grid, "selected", _item_selected_cb, picker);
   evas_object_smart_callback_add(picker->grid, "unselected", _item_unselected_cb, picker);

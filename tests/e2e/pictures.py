@@ -1,0 +1,108 @@
+"""Pictures of the screens of reporting, in both palettes and at each size: what docs/pictures/ shows."""
+
+import pathlib
+import sys
+import tempfile
+
+from phone_driver import Phone, wait_until
+from road import Road
+
+TITLE = "Thumbnails stay grey after update"
+TEXT = "Since this morning's update the album view shows grey boxes. Opening a picture and going back mends that one only."
+IDEA = "Swipe to undo in Notes"
+VARIANTS = [(size, theme) for size in ("720x1280", "480x800", "1280x720", "800x480") for theme in ("light", "dark")]
+
+
+class Pictures:
+    def __init__(self, folder, size, theme):
+        self.folder = pathlib.Path(folder)
+        self.ending = f"{size}-{theme}.png"
+        self.size, self.theme = size, theme
+        width, height = map(int, size.split("x"))
+        self.is_upright = height > width  # on its side, the attachments are below what is shown
+
+    def take(self, phone, name):
+        phone.close_notifications()
+        print(phone.screenshot(self.folder / f"{name}-{self.ending}"), flush=True)
+
+    def problem(self, road):
+        road.screen.activate("Report a problem")
+        road.screen.activate("About: Choose what it is about")
+        road.screen.wait_for("Battery")
+        self.take(road.phone, "picker")
+        road.screen.activate("Search")
+        road.screen.type_text("Search for a name", "ba")
+        road.screen.wait_gone("Network")
+        self.take(road.phone, "picker-search")
+        road.screen.activate("Battery")
+        road.write(TITLE, TEXT, "What happened? What did you expect?")
+        if self.is_upright:
+            self.attach(road)
+        self.take(road.phone, "problem")
+
+    def attach(self, road):
+        road.screen.activate("Attach pictures")
+        self.take(road.phone, "attach")
+        road.screen.activate("Choose from gallery")
+        road.screen.activate("morning.png")
+        self.take(road.phone, "gallery")
+        road.screen.activate("banner.jpg")
+        road.screen.activate("Attach (2)")
+        road.screen.wait_for("Remove banner.jpg")
+        wait_until(lambda: "kB" in road.screen.description("System log"), what="the log's size")
+
+    def what_is_sent(self, road):
+        road.screen.activate("More")
+        road.screen.wait_for("What is sent")
+        self.take(road.phone, "menu")
+        road.screen.activate("What is sent")
+        road.screen.wait_for("Your text")
+        self.take(road.phone, "review")
+        if self.is_upright:
+            wait_until(lambda: road.screen.description("Device status"), what="the device status")
+            road.screen.activate("Device status")
+            road.screen.wait_gone("Your text")
+            self.take(road.phone, "device-status")
+            road.back()
+        if self.is_upright:
+            road.screen.activate("Picture 1")
+            road.screen.wait_gone("Your text")
+            self.take(road.phone, "picture")
+            road.back()
+        road.back()
+
+    def leaving(self, road):
+        road.screen.activate("Back")
+        road.screen.wait_for("Keep writing")
+        self.take(road.phone, "leave")
+        road.screen.activate("Save as draft")
+        road.screen.wait_for("Report a problem")
+        road.write_idea("Network", IDEA, "Two fingers to the left take back what was typed last.")
+        self.take(road.phone, "idea")
+
+    def play(self):
+        with Phone() as phone:
+            phone.start("--accessible", "--size", self.size, "--no-client")
+            phone.preference("set", "tavro_theme", "string", self.theme)
+            phone.launch()
+            road = Road(phone)
+            road.choose_account()
+            road.add_pictures("morning.png", "banner.jpg")
+            self.problem(road)
+            self.what_is_sent(road)
+            self.leaving(road)
+
+
+if __name__ == "__main__":
+    try:
+        target = pathlib.Path(sys.argv[1] if len(sys.argv) > 1 else tempfile.mkdtemp(prefix="tavro-pictures."))
+        target.mkdir(parents=True, exist_ok=True)
+        if len(sys.argv) > 3:
+            Pictures(target, sys.argv[2], sys.argv[3]).play()
+        else:
+            # A process each: the accessibility library keeps its first connection.
+            import subprocess
+            for size, theme in VARIANTS:
+                subprocess.run([sys.executable, __file__, str(target), size, theme], check=True)
+    except AssertionError as fault:
+        sys.exit(f"pictures: {fault}")
