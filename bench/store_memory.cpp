@@ -10,6 +10,7 @@
 #include <cstdio>
 
 #include "store_sizes.h"
+#include "tavro_dbmgr_catalogue.h"
 #include "tavro_memory.h"
 #include "tavro_type.h"
 
@@ -106,6 +107,31 @@ void _release(char *text) {
   TAVRO_FREE(text);
 }
 
+void _list_application() {
+  char package[] = "org.example", app[] = "org.example.app", name[] = "Example", icon[] = "/icon.png";
+  const tavro_pkg_info record = {1, package, app, name, icon};
+  tavro_dbmgr_update_app_list(&record);
+}
+
+void _read_applications() {
+  g_slist_free_full(tavro_dbmgr_get_downloaded_app_list(),
+                    [](gpointer app) { tavro_db_free_app_info(static_cast<tavro_pkg_info *>(app)); });
+}
+
+void _receive_programme() {
+  char name[] = "Example";
+  tavro_dbmgr_beta_details details = {};
+  details.betaId = 1;
+  details.betaName = name;
+  if (tavro_dbmgr_update_beta_details(&details) == -1) std::abort();
+}
+
+void _read_banners() {
+  GSList *banners = nullptr;
+  if (tavro_dbmgr_get_banner_list(&banners) == -1) std::abort();
+  tavro_dbmgr_free_banner_list(banners);
+}
+
 struct operation {
   const char *name;
   void (*run)();
@@ -130,6 +156,12 @@ const operation kOperations[] = {
     {"answer read", [] { tavro_dbmgr_update_read_push_notifications(50, 1); }},
     {"sending state", [] { tavro_dbmgr_update_sending_state(50, TAVRO_STATUS_SENDING_FAILED_NO_NETWORK); }},
     {"accepted by the server", [] { tavro_dbmgr_set_voc_data_submitted_to_server(50, 50, 12); }},
+    {"application listed", _list_application},
+    {"listed applications", _read_applications},
+    {"crash time", [] { tavro_dbmgr_set_app_crash_time("org.example.app"); }},
+    {"beta programme received", _receive_programme},
+    {"beta programme's name", [] { _release(tavro_dbmgr_get_beta_name(1)); }},
+    {"banners", _read_banners},
     {"dump renamed", [] { tavro_dbmgr_update_dump_file_bug_report("old.zip", "new.zip"); }},
     {"no network for what is being sent", [] { tavro_dbmgr_set_voc_network_status(kBenchUser); }},
     {"delete by id", [] { tavro_dbmgr_destroy_vocs_by_id(50); }},

@@ -5,7 +5,8 @@
 // either calls tavro_dbmgr_ensure_schema before its first read or write. After that every operation is one
 // critical section: take the lock, open the file, run the statements, close, give the lock back; nothing is
 // kept open between calls. Operations block while another process works on the store and are called on the
-// main loop only.
+// main loop only. Opening the store limits the memory of SQLite's pages for the whole process, other
+// databases included: sqlite3_soft_heap_limit64.
 //
 // On disk: the file below, SQLite's journal and, when damage was met, empty marks beside it
 // (".tavro.db.suspect", ".tavro.db.replaced"), readable by the owner alone. A save is several
@@ -147,7 +148,7 @@ enum tavro_dbmgr_store_state {
 };
 
 // Make folder, file, tables and indexes as far as they are missing. Harmless when two processes do it at
-// once. Reads the whole file only after an operation met damage in it.
+// once. Reads the whole file only after damage was met in it, and heals what is not damage of a table.
 tavro_dbmgr_store_state tavro_dbmgr_ensure_schema();
 
 // Whether a store was set aside, by this program or the other, and the person does not know yet.
@@ -176,7 +177,9 @@ char *_tavro_dbmgr_get_col_data(sqlite3 *db, const char *table, const char *colu
 // ---- Saving reports ----
 
 // Store a new report with status `submitted`: row, attachments in list order, extension row. Sets `type`.
-// Returns the new VOC_ID; below 1 when nothing was stored (-1: null record or file not opened).
+// Returns the new VOC_ID; below 1 when the report was not stored (-1: null record or file not opened). When
+// the row is refused, attachments and extension row are stored under id 0 all the same, unless another
+// program has locked the file: each statement waits 5 seconds for that, and these would wait in vain.
 int tavro_dbmgr_update_bug_report(tavro_dbmgr_bug_report_info *report);
 int tavro_dbmgr_update_suggestion(tavro_dbmgr_suggestion_info *suggestion);
 

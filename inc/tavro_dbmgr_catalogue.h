@@ -14,7 +14,8 @@
 // other takes the lock itself and, called while its caller holds it, would wait for ever.
 //
 // Results are 0, or -1 when an input is null or the file cannot be opened, each with a log line; a statement
-// that fails is logged and does not change the result. Times are milliseconds since the epoch, below 2^63.
+// that fails is logged and does not change the result. Times are milliseconds since the epoch; one of 2^63
+// and more is stored as 2^63 - 1.
 #pragma once
 
 #include <glib.h>

@@ -11,6 +11,7 @@
 #include <sqlite3.h>
 #include <unistd.h>
 
+#include <cerrno>
 #include <cstdio>
 #include <memory>
 #include <string>
@@ -66,7 +67,19 @@ TavroOut<Owner> tavro_out(Owner &owner) {
   return TavroOut<Owner>(owner);
 }
 
-// A file descriptor; -1 when it holds none.
+// Keeps errno as it was: what closes and removes behind a failure must not hide its reason.
+class TavroKeptErrno {
+ public:
+  TavroKeptErrno() = default;
+  TavroKeptErrno(const TavroKeptErrno &) = delete;
+  TavroKeptErrno &operator=(const TavroKeptErrno &) = delete;
+  ~TavroKeptErrno() { errno = reason_; }
+
+ private:
+  const int reason_ = errno;
+};
+
+// A file descriptor; -1 when it holds none. Its end leaves errno alone.
 class TavroFd {
  public:
   explicit TavroFd(int fd = -1) : fd_(fd) {}
@@ -76,6 +89,7 @@ class TavroFd {
     return *this;
   }
   ~TavroFd() {
+    const TavroKeptErrno kept;
     if (fd_ >= 0) close(fd_);
   }
   int get() const { return fd_; }
@@ -86,13 +100,14 @@ class TavroFd {
   int fd_;
 };
 
-// Removes a half-made file unless keep() was called once it had its final name.
+// Removes a half-made file unless keep() was called once it had its final name. Its end leaves errno alone.
 class TavroUnfinishedFile {
  public:
   explicit TavroUnfinishedFile(std::string path) : path_(std::move(path)) {}
   TavroUnfinishedFile(const TavroUnfinishedFile &) = delete;
   TavroUnfinishedFile &operator=(const TavroUnfinishedFile &) = delete;
   ~TavroUnfinishedFile() {
+    const TavroKeptErrno kept;
     if (!path_.empty()) unlink(path_.c_str());
   }
   void keep() { path_.clear(); }

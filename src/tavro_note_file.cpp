@@ -24,6 +24,7 @@ bool _write_all(int fd, const char *data, gsize size) {
   while (size > 0) {
     const ssize_t written = write(fd, data, size);
     if (written == -1 && errno == EINTR) continue;
+    if (written == 0) errno = EIO;
     if (written <= 0) return false;
     data += written;
     size -= static_cast<gsize>(written);

@@ -170,7 +170,7 @@ int _noted_row(GKeyFile *file) {
 
 // A save whose row was refused leaves its attachments and its extension row behind, under no report.
 int _without_remains(int voc_id) {
-  if (voc_id == 0) tavro_dbmgr_destroy_vocs_by_id(voc_id);
+  if (voc_id == 0) store_remove_remains();
   return voc_id;
 }
 
@@ -191,19 +191,28 @@ int _complete(GKeyFile *file) {
   return store_is_voc_complete(id) && store_has_attachments(id, attachment_count) ? id : 0;
 }
 
-void _set_damaged_aside(const char *reason) {
+void _set_damaged_aside(const char *path, const char *reason) {
   TAVRO_LOGE("save journal is damaged, kept as %s: %s", kDamagedPath, reason);
-  rename(kPath, kDamagedPath);
+  rename(path, kDamagedPath);
+}
+
+// Null when there is no note, when it is damaged, and when it cannot be read now (no memory, a failing disk):
+// then it stays for a later time.
+TavroKeyFile _load(const char *path) {
+  TavroKeyFile file(g_key_file_new());
+  TavroError error;
+  if (g_key_file_load_from_file(file.get(), path, G_KEY_FILE_NONE, tavro_out(error))) return file;
+  if (error->domain == G_KEY_FILE_ERROR)
+    _set_damaged_aside(path, error->message);
+  else if (!g_error_matches(error.get(), G_FILE_ERROR, G_FILE_ERROR_NOENT))
+    TAVRO_LOGE("save journal cannot be read now: %s", error->message);
+  return nullptr;
 }
 
 // The noted report, complete now; 0 when there is none, or it cannot be completed yet.
 int _recover() {
-  const TavroKeyFile file(g_key_file_new());
-  TavroError error;
-  if (!g_key_file_load_from_file(file.get(), kPath, G_KEY_FILE_NONE, tavro_out(error))) {
-    if (!g_error_matches(error.get(), G_FILE_ERROR, G_FILE_ERROR_NOENT)) _set_damaged_aside(error->message);
-    return 0;
-  }
+  const TavroKeyFile file = _load(kPath);
+  if (!file) return 0;
   const TavroGText type(g_key_file_get_string(file.get(), kReport, kType, nullptr));
   int id = 0;
   if (g_strcmp0(type.get(), TAVRO_DBMGR_BUG_REPORT) == 0) {
@@ -211,7 +220,7 @@ int _recover() {
   } else if (g_strcmp0(type.get(), TAVRO_DBMGR_SUGGESTION) == 0) {
     id = _complete<tavro_dbmgr_suggestion_info>(file.get());
   } else {
-    _set_damaged_aside("unknown type");
+    _set_damaged_aside(kPath, "unknown type");
   }
   if (id < 1) return 0;
   _remove(kPath);
@@ -222,18 +231,14 @@ int _recover() {
 // Take what was stored of an abandoned report out of the store. A full disk may refuse that too: then the
 // note stays, and it is tried again before the next save.
 void _drop_abandoned() {
-  const TavroKeyFile file(g_key_file_new());
-  TavroError error;
-  if (!g_key_file_load_from_file(file.get(), kAbandonedPath, G_KEY_FILE_NONE, tavro_out(error))) {
-    if (!g_error_matches(error.get(), G_FILE_ERROR, G_FILE_ERROR_NOENT)) _remove(kAbandonedPath);
-    return;
-  }
+  const TavroKeyFile file = _load(kAbandonedPath);
+  const int last_id = file ? store_last_voc_id() : -1;
+  if (last_id < 0) return;
   _without_remains(0);
-  const int last_id = store_last_voc_id();
   // In a store that was replaced since, a row with these texts is another report.
   const bool is_same_store = last_id >= g_key_file_get_integer(file.get(), kReport, kLastVocId, nullptr);
   const int id = is_same_store ? _noted_row(file.get()) : 0;
-  if (last_id < 0 || id < 0) return;
+  if (id < 0) return;
   if (id >= 1) tavro_dbmgr_destroy_vocs_by_id(id);
   const int left = id >= 1 ? _noted_row(file.get()) : 0;
   if (id == 0 || (left >= 0 && left != id)) _remove(kAbandonedPath);

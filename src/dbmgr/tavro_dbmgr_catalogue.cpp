@@ -103,9 +103,9 @@ int _tavro_dbmgr_get_matching_record_count(sqlite3 *db, const char *table, const
 int _tavro_dbmgr_get_matching_record_list(sqlite3 *db, const char *table, const char *where,
                                           const char *order, tavro_dbmgr_record_list_type type,
                                           GSList **list) {
+  if (list) *list = nullptr;
   const catalogue_layout *layout = _layout_of_list(type);
   if (!db || !table || !layout || !list) return _refuse();
-  *list = nullptr;
   statement_text sql;
   sa_strcat(sql, "SELECT * FROM ", table, where ? " WHERE " : "", where);
   sa_strcat(sql, order ? " " : "", order, ";");
@@ -158,7 +158,10 @@ catalogue_row catalogue_compare(sqlite3 *db, const catalogue_layout &layout, con
   for (const char *column : tracked_columns) {
     const auto *stored = reinterpret_cast<const char *>(sqlite3_column_text(statement.get(), index++));
     const std::optional<std::string> value = _value_of(layout, record, column);
-    if (value && (!stored || *value != stored)) changes.push_back({column, *value});
+    if (!value)
+      TAVRO_LOGD("invalid inputs");
+    else if (!stored || *value != stored)
+      changes.push_back({column, *value});
   }
   return catalogue_row::present;
 }
@@ -186,8 +189,10 @@ char *catalogue_read_text(const char *table, const char *column, const std::stri
 }
 
 unsigned long long catalogue_read_time(const char *table, const char *column, const std::string &where) {
-  const TavroText value(catalogue_read_text(table, column, where));
-  return value ? g_ascii_strtoull(value.get(), nullptr, 10) : 0;
+  // Cast: an earlier version stored a time of 2^63 and more as a fraction.
+  const std::string whole = std::string("CAST(") + column + " AS INTEGER)";
+  const TavroText value(catalogue_read_text(table, whole.c_str(), where));
+  return value ? catalogue_time_of(g_ascii_strtoll(value.get(), nullptr, 10)) : 0;
 }
 
 int catalogue_read_number(const char *table, const char *column, const std::string &where) {

@@ -66,10 +66,9 @@ int tavro_dbmgr_update_beta_details(const tavro_dbmgr_beta_details *details) {
 int tavro_dbmgr_update_beta_user_status(long beta_id, int status) {
   return catalogue_run([beta_id, status](sqlite3 *db) {
     const std::string where = _programme(beta_id);
-    if (_tavro_dbmgr_get_matching_record_count(db, kTable, where.c_str()) < 1) {
-      TAVRO_LOGD("No records found with betaId:%ld", beta_id);
-      return 0;
-    }
+    const int count = _tavro_dbmgr_get_matching_record_count(db, kTable, where.c_str());
+    if (count == 0) TAVRO_LOGD("No records found with betaId:%ld", beta_id);
+    if (count < 1) return 0;
     const char *text = catalogue_beta_status_text(status);
     TAVRO_LOGD("betaId [%ld] userStatus =%s", beta_id, text);
     catalogue_write_change(db, kTable, "BETA_USER_STATUS", text, where.c_str());

@@ -39,6 +39,10 @@ const catalogue_layout &catalogue_user_profile_layout();
 
 // A field as it is stored; none for a null text.
 std::optional<std::string> catalogue_value(const catalogue_column &column, const void *record);
+// A stored time; what is below 0 was never one.
+inline unsigned long long catalogue_time_of(gint64 stored) {
+  return stored > 0 ? static_cast<unsigned long long>(stored) : 0;
+}
 // A new tracked record of the current row. Columns are matched by name.
 void *catalogue_read_record(const catalogue_layout &layout, sqlite3_stmt *statement);
 void catalogue_free_record(const catalogue_layout &layout, void *record);

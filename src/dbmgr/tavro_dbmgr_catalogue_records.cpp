@@ -1,4 +1,5 @@
 // The catalogue's records: which field stands in which column, as what, and how a record is read and freed.
+#include <algorithm>
 #include <type_traits>
 
 #include "tavro_dbmgr_catalogue_internal.h"
@@ -40,8 +41,7 @@ void _read_field(const catalogue_column &column, void *record, sqlite3_stmt *sta
       _at<long>(record, column) = sqlite3_column_int64(statement, index);
       break;
     case catalogue_field::time:
-      _at<unsigned long long>(record, column) =
-          static_cast<unsigned long long>(sqlite3_column_int64(statement, index));
+      _at<unsigned long long>(record, column) = catalogue_time_of(sqlite3_column_int64(statement, index));
       break;
     case catalogue_field::beta_status:
       _at<int>(record, column) =
@@ -183,7 +183,9 @@ std::optional<std::string> catalogue_value(const catalogue_column &column, const
     case catalogue_field::id:
       return std::to_string(_get<long>(record, column));
     case catalogue_field::time:
-      return std::to_string(_get<unsigned long long>(record, column));
+      // The highest that the column holds as a whole number.
+      return std::to_string(
+          std::min<unsigned long long>(_get<unsigned long long>(record, column), G_MAXINT64));
     case catalogue_field::beta_status:
       return catalogue_beta_status_text(_get<int>(record, column));
   }

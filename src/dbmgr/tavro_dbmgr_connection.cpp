@@ -12,8 +12,6 @@
 namespace {
 
 constexpr std::size_t kPathBytes = 500;
-// Should two processes ever get past the lock at once, SQLite's own locks make the second wait.
-constexpr int kBusyTimeoutMilliseconds = 5000;
 // An operation that walks a large table keeps its pages until it closes, up to 2 MB of them by SQLite's own
 // measure. Once the process's SQLite memory is above this, a new page takes the place of an old one instead.
 // A save, or a report that is read, needs a quarter of it.
@@ -22,7 +20,7 @@ constexpr sqlite3_int64 kPageMemoryBytes = 512 * 1024;
 int _open_connection(const char *path, TavroDb &db) {
   sqlite3_soft_heap_limit64(kPageMemoryBytes);
   const int ret = sqlite3_open(path, tavro_out(db));
-  if (ret == SQLITE_OK) sqlite3_busy_timeout(db.get(), kBusyTimeoutMilliseconds);
+  if (ret == SQLITE_OK) sqlite3_busy_timeout(db.get(), kStoreBusyTimeoutMilliseconds);
   return ret;
 }
 
@@ -30,15 +28,23 @@ void _log_sql_error(const char *message) {
   TAVRO_LOGD("SQL ERROR: %s  : %s", message, std::strerror(errno));
 }
 
-// The lock is held when it returns a connection, and free otherwise.
+// What tavro_dbmgr_db_open took and tavro_dbmgr_db_close gives back. One is enough: nobody takes the lock
+// twice.
+bool is_lock_taken_by_open = false;
+
+void _give_back() {
+  if (std::exchange(is_lock_taken_by_open, false)) tavro_dbmgr_sem_signal();
+}
+
+// The lock is held when it returns a connection, if it can be taken, and free otherwise.
 sqlite3 *_open_under_lock(const char *db_path) {
   char path[kPathBytes] = {};
   g_strlcpy(path, db_path, sizeof path);
-  tavro_dbmgr_sem_wait();
+  is_lock_taken_by_open = tavro_dbmgr_sem_wait() == 0;
   TavroDb opened;
   if (_open_connection(path, opened) == SQLITE_OK) return opened.release();
   _log_sql_error(sqlite3_errmsg(opened.get()));
-  tavro_dbmgr_sem_signal();
+  _give_back();
   return nullptr;
 }
 
@@ -73,7 +79,7 @@ int tavro_dbmgr_db_close(sqlite3 *db) {
   TAVRO_LOGD("entry");
   if (db) {
     sqlite3_close(db);
-    tavro_dbmgr_sem_signal();
+    _give_back();
   } else {
     TAVRO_LOGD("db handle is NULL");
   }

@@ -29,6 +29,19 @@ void tavro_dbmgr_destroy_vocs_by_id(int voc_id) {
   _delete_of_report("DELETE FROM TABLE_VOC WHERE VOC_ID", voc_id);
 }
 
+void store_remove_remains() {
+  const int remains = [] {
+    const store_session store;
+    return store ? store_read_number(
+                       store.db(),
+                       "SELECT EXISTS(SELECT 1 FROM ATTACHMENT WHERE ATTACHMENT_SUGGESTION_ID = 0) OR "
+                       "EXISTS(SELECT 1 FROM TABLE_VOC_EXTENDED WHERE VOC_ID = 0);",
+                       -1)
+                 : -1;
+  }();
+  if (remains > 0) tavro_dbmgr_destroy_vocs_by_id(0);
+}
+
 void tavro_dbmgr_destroy_attachments_by_filename(const char *file_path) {
   if (!file_path) {
     TAVRO_LOGD("Attachment Filepath NULL");

@@ -73,6 +73,9 @@ class store_lock {
   bool is_held_;
 };
 
+// Should two processes ever get past the lock at once, SQLite's own locks make the second wait.
+constexpr int kStoreBusyTimeoutMilliseconds = 5000;
+
 enum class open_failure { log_with_system_error, log_plainly };
 
 // A connection to the store's file; null, and a log line, when it cannot be opened.
@@ -104,9 +107,21 @@ int store_run(const statement_text &sql);
 // First number of the first row; `otherwise` when there is no row or the statement fails.
 int store_read_number(sqlite3 *db, const char *sql, int otherwise);
 
+// ---- Damage ----
+
+// Whether the connection's last failure was for a damaged page, or no database at all.
+bool store_is_damage(sqlite3 *db);
 // After a statement failed: has the whole file checked at the next tavro_dbmgr_ensure_schema when the reason
-// was a damaged page.
+// was a damaged page of our own file.
 void store_note_error(sqlite3 *db);
+bool store_is_suspect();
+// Read the whole file. Damage that is not in a table is healed and nothing is lost; no suspicion is left
+// then. False when a table is damaged. True also when it cannot be told or healed now (locked, full disk):
+// the suspicion stays.
+bool store_heal(sqlite3 *db);
+// Give the file, with SQLite's beside it, a dated name and mark that the person is to be told. False, with a
+// log line, when it stays.
+bool store_set_aside();
 
 // ---- Rows ----
 
@@ -170,5 +185,7 @@ int store_find_voc_above(int voc_id, const char *type, const char *user_name, co
 // Whether the save of a report came to its end, the extension row.
 bool store_is_voc_complete(int voc_id);
 bool store_has_attachments(int voc_id, unsigned int count);
+// Take out what refused saves left under id 0. Costs a look when there is nothing.
+void store_remove_remains();
 // Write the attachments of a report anew.
 void store_replace_attachments(const GSList *attachments, int voc_id);

@@ -4,6 +4,7 @@
 #include <time.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cerrno>
 #include <cstring>
 
@@ -18,6 +19,7 @@ namespace {
 constexpr key_t kLockKey = 95157331;
 constexpr unsigned short kAnyProcessMayUseIt = 0777;  // the service may run as another user
 constexpr long kNanosecondsPerMillisecond = 1000 * 1000;
+constexpr gint64 kPatienceMicroseconds = 500 * 1000;
 constexpr int kSetUpPollMilliseconds = 5;
 constexpr int kSetUpPolls = 100;
 
@@ -62,9 +64,14 @@ bool _was_set_up(int semid) {
 void _await_running_operation(int semid) {
   if (!_was_set_up(semid)) return;
   sembuf take = {0, -1, SEM_UNDO};
-  const timespec patience = {0, 500 * kNanosecondsPerMillisecond};
-  if (semtimedop(semid, &take, 1, &patience) == -1 && errno == EAGAIN)
-    TAVRO_LOGD("store lock was held for long, set free");
+  const gint64 end = g_get_monotonic_time() + kPatienceMicroseconds;
+  int ret;
+  do {  // again when a signal handler ran, for what is left of the time
+    const timespec patience = {0,
+                               static_cast<long>(std::max<gint64>(end - g_get_monotonic_time(), 0)) * 1000};
+    ret = semtimedop(semid, &take, 1, &patience);
+  } while (ret == -1 && errno == EINTR);
+  if (ret == -1 && errno == EAGAIN) TAVRO_LOGD("store lock was held for long, set free");
 }
 
 // The set exists: whoever made it is given the time to set it up.

@@ -5,18 +5,35 @@ namespace {
 
 // A save's first part: the report's row, then its attachments under the same hold of the lock, each through a
 // connection of its own. Returns the new id; 0 when the row was refused.
-int _insert_report(const statement_text &sql, const GSList *attachments) {
+int _insert_report(const statement_text &sql, const GSList *attachments, bool *is_locked_out) {
   const store_lock lock;
   TavroDb db = store_open();
   if (!db) return -1;
   // SQLite also remembers the id of a row whose commit failed on a full disk.
   const bool is_stored = store_execute_logged(db.get(), sql);
+  *is_locked_out = !is_stored && sqlite3_errcode(db.get()) == SQLITE_BUSY;
   const int id = is_stored ? static_cast<int>(sqlite3_last_insert_rowid(db.get())) : 0;
   TAVRO_LOGD("Inserted Row ID: %d", id);
   db.reset();
   // Kept: a refused report's attachments, and its extension row, are stored under id 0 all the same. The
-  // client removes them.
-  store_add_attachments(attachments, id);
+  // client removes them. But a person would wait for each of them while another program has locked the file.
+  if (!*is_locked_out) store_add_attachments(attachments, id);
+  return id;
+}
+
+void _save_extension(const tavro_dbmgr_bug_report_info *report, int id) {
+  tavro_dbmgr_update_bug_report_extended(report, id);
+}
+
+void _save_extension(const tavro_dbmgr_suggestion_info *suggestion, int id) {
+  tavro_dbmgr_update_suggestion_extended(suggestion, id);
+}
+
+template <typename Report>
+int _save(const statement_text &sql, const Report *report) {
+  bool is_locked_out = false;
+  const int id = _insert_report(sql, report->attachments, &is_locked_out);
+  if (id >= 0 && !is_locked_out) _save_extension(report, id);
   return id;
 }
 
@@ -50,9 +67,7 @@ int tavro_dbmgr_update_bug_report(tavro_dbmgr_bug_report_info *report) {
   sa_strcat_values(sql, {report->type, report->description, report->app_name, report->app_icon,
                          report->severity, report->dump_file, std::to_string(report->submitted).c_str(),
                          report->dump_name, report->user_name, now.c_str(), now.c_str(), "0"});
-  const int id = _insert_report(sa_strcat(sql, ");"), report->attachments);
-  if (id >= 0) tavro_dbmgr_update_bug_report_extended(report, id);
-  return id;
+  return _save(sa_strcat(sql, ");"), report);
 }
 
 int tavro_dbmgr_update_suggestion(tavro_dbmgr_suggestion_info *suggestion) {
@@ -66,9 +81,7 @@ int tavro_dbmgr_update_suggestion(tavro_dbmgr_suggestion_info *suggestion) {
   sa_strcat_values(sql, {suggestion->type, suggestion->suggestion, suggestion->app_name, suggestion->app_icon,
                          suggestion->severity, std::to_string(suggestion->submitted).c_str(),
                          suggestion->user_name, now.c_str(), now.c_str(), "0"});
-  const int id = _insert_report(sa_strcat(sql, ");"), suggestion->attachments);
-  if (id >= 0) tavro_dbmgr_update_suggestion_extended(suggestion, id);
-  return id;
+  return _save(sa_strcat(sql, ");"), suggestion);
 }
 
 int tavro_dbmgr_update_bug_report_with_server_voc_id(tavro_dbmgr_bug_report_info *report) {
@@ -85,9 +98,7 @@ int tavro_dbmgr_update_bug_report_with_server_voc_id(tavro_dbmgr_bug_report_info
                     report->dump_file, std::to_string(report->submitted).c_str(), report->push_comments, "1",
                     report->dump_name, report->user_name, report->date_of_creation, report->date_of_updation,
                     std::to_string(report->server_voc_id).c_str()});
-  const int id = _insert_report(sa_strcat(sql, ");"), report->attachments);
-  if (id >= 0) tavro_dbmgr_update_bug_report_extended(report, id);
-  return id;
+  return _save(sa_strcat(sql, ");"), report);
 }
 
 int tavro_dbmgr_update_suggestion_with_server_voc_id(tavro_dbmgr_suggestion_info *suggestion) {
@@ -103,9 +114,7 @@ int tavro_dbmgr_update_suggestion_with_server_voc_id(tavro_dbmgr_suggestion_info
                          suggestion->severity, std::to_string(suggestion->submitted).c_str(),
                          suggestion->push_comments, "1", suggestion->user_name, suggestion->date_of_creation,
                          suggestion->date_of_updation, std::to_string(suggestion->server_voc_id).c_str()});
-  const int id = _insert_report(sa_strcat(sql, ");"), suggestion->attachments);
-  if (id >= 0) tavro_dbmgr_update_suggestion_extended(suggestion, id);
-  return id;
+  return _save(sa_strcat(sql, ");"), suggestion);
 }
 
 void tavro_dbmgr_update_bug_report_extended(const tavro_dbmgr_bug_report_info *report, int voc_id) {

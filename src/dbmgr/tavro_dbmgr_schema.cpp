@@ -2,7 +2,6 @@
 #include <fcntl.h>
 #include <sys/file.h>
 #include <sys/stat.h>
-#include <time.h>
 
 #include <cerrno>
 
@@ -117,38 +116,25 @@ bool _is_seed_banner_image_known(sqlite3 *db) {
   return !stored || _seed_banner_image() == stored.get();
 }
 
-// Made by an operation that met a damaged page. Only then is the whole file read at the next start.
-constexpr char kSuspectMark[] = TAVRO_DBMGR_FOLDER "/.tavro.db.suspect";
-
 enum class contents { complete, incomplete, empty, no_store, unreadable };
 
 // Neither ours nor repairable, or just not readable now (locked, no permission)?
 contents _after_error(sqlite3 *db) {
-  const int error = sqlite3_errcode(db);
-  return error == SQLITE_NOTADB || error == SQLITE_CORRUPT ? contents::no_store : contents::unreadable;
+  return store_is_damage(db) ? contents::no_store : contents::unreadable;
 }
 
-// False only for damage: a check that cannot run now says nothing.
-bool _passes(sqlite3 *db, const char *check, TavroText *finding = nullptr) {
-  const TavroStmt statement = store_prepare(db, check);
-  if (!statement || !store_next_row(statement.get())) return _after_error(db) != contents::no_store;
-  if (finding) finding->reset(store_column_text(statement.get(), 0));
-  return true;
-}
-
+// A table that is missing can be made; one that lacks a column is another program's.
 bool _has_our_columns(sqlite3 *db) {
   for (const char *sql : kNameTheColumns)
-    if (!store_prepare(db, sql) && sqlite3_errcode(db) == SQLITE_ERROR) return false;
+    if (!store_prepare(db, sql) && sqlite3_errcode(db) == SQLITE_ERROR &&
+        !std::strstr(sqlite3_errmsg(db), "no such table"))
+      return false;
   return true;
 }
 
-bool _passes_whole_check(sqlite3 *db) {
-  TavroText finding;
-  if (!_passes(db, "PRAGMA quick_check(1);", &finding)) return false;
-  if (!finding) return true;
-  if (std::strcmp(finding.get(), "ok") != 0) return false;
-  unlink(kSuspectMark);
-  return true;
+bool _can_read_the_ends(sqlite3 *db) {
+  const TavroStmt statement = store_prepare(db, kReadTheEnds);
+  return (statement && store_next_row(statement.get())) || !store_is_damage(db);
 }
 
 contents _inspect() {
@@ -158,13 +144,16 @@ contents _inspect() {
   if (!db) return contents::unreadable;
   const int table_count = store_read_number(db.get(), kCountTables, -1);
   if (table_count < 0) return _after_error(db.get());
-  if (table_count == 0)
-    return store_read_number(db.get(), kCountAnyTables, 0) == 0 ? contents::empty : contents::no_store;
-  if (access(kSuspectMark, F_OK) == 0 && !_passes_whole_check(db.get())) return contents::no_store;
-  if (table_count < kTableCount) return contents::incomplete;
-  if (!_has_our_columns(db.get()) || !_passes(db.get(), kReadTheEnds)) return contents::no_store;
-  const bool is_complete =
-      store_read_number(db.get(), kCountIndexes, 0) == kIndexCount && _is_seed_banner_image_known(db.get());
+  if (table_count == 0) {
+    const int others = store_read_number(db.get(), kCountAnyTables, -1);
+    return others < 0 ? _after_error(db.get()) : others == 0 ? contents::empty : contents::no_store;
+  }
+  if (!_has_our_columns(db.get())) return contents::no_store;
+  const bool is_suspect = store_is_suspect() || !_can_read_the_ends(db.get());
+  if (is_suspect && !store_heal(db.get())) return contents::no_store;
+  const bool is_complete = table_count == kTableCount &&
+                           store_read_number(db.get(), kCountIndexes, 0) == kIndexCount &&
+                           _is_seed_banner_image_known(db.get());
   return is_complete ? contents::complete : contents::incomplete;
 }
 
@@ -191,35 +180,6 @@ TavroFd _take_creation_guard() {
   return folder;
 }
 
-std::string _dated_name() {
-  const time_t now = time(nullptr);
-  tm local = {};
-  localtime_r(&now, &local);
-  char date[sizeof "YYYYMMDDhhmmss"] = {};
-  strftime(date, sizeof date, "%Y%m%d%H%M%S", &local);
-  const std::string name = std::string(TAVRO_DBMGR_FILE) + ".damaged-" + date;
-  std::string free_name = name;
-  for (int i = 2; access(free_name.c_str(), F_OK) == 0; i++) free_name = name + "." + std::to_string(i);
-  return free_name;
-}
-
-// Stays until the person was told, whichever program found the damage.
-constexpr char kReplacedMark[] = TAVRO_DBMGR_FOLDER "/.tavro.db.replaced";
-
-// SQLite's journal goes first: left behind, it would be rolled back into the new store.
-bool _set_aside() {
-  const std::string name = _dated_name();
-  rename(TAVRO_DBMGR_FILE "-journal", (name + "-journal").c_str());
-  if (rename(TAVRO_DBMGR_FILE, name.c_str()) == -1) {
-    TAVRO_LOGE("damaged store could not be set aside: %s", std::strerror(errno));
-    return false;
-  }
-  TAVRO_LOGE("store is damaged or not ours, kept as %s", name.c_str());
-  unlink(kSuspectMark);
-  const TavroFd mark(open(kReplacedMark, O_WRONLY | O_CREAT | O_CLOEXEC, 0600));
-  return true;
-}
-
 // SQLite would make it with the mode that the process's mask leaves.
 void _create_private_file() {
   const TavroFd created(open(TAVRO_DBMGR_FILE, O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0600));
@@ -237,25 +197,12 @@ tavro_dbmgr_store_state _mend(contents found) {
   if (found == contents::complete) return TAVRO_STORE_READY;
   if (found == contents::unreadable) return TAVRO_STORE_UNUSABLE;
   const bool is_replaced = found == contents::no_store;
-  if (is_replaced && !_set_aside()) return TAVRO_STORE_UNUSABLE;
+  if (is_replaced && !store_set_aside()) return TAVRO_STORE_UNUSABLE;
   if (!_create_schema(found)) return TAVRO_STORE_UNUSABLE;
   return is_replaced ? TAVRO_STORE_REPLACED : TAVRO_STORE_READY;
 }
 
 }  // namespace
-
-void store_note_error(sqlite3 *db) {
-  if (_after_error(db) != contents::no_store) return;
-  const TavroFd mark(open(kSuspectMark, O_WRONLY | O_CREAT | O_CLOEXEC, 0600));
-}
-
-bool tavro_dbmgr_is_replacement_untold() {
-  return access(kReplacedMark, F_OK) == 0;
-}
-
-void tavro_dbmgr_set_replacement_told() {
-  unlink(kReplacedMark);
-}
 
 tavro_dbmgr_store_state tavro_dbmgr_ensure_schema() {
   if (g_mkdir_with_parents(TAVRO_DBMGR_FOLDER, 0700) == -1) {

@@ -43,9 +43,13 @@ constexpr char kObjectReplacement[] = "\xef\xbf\xbc";
 std::string _reply_as_markup(const char *comments) {
   std::string reply = comments && *comments ? comments : kNoReply;
   std::replace(reply.begin(), reply.end(), '#', ' ');
-  for (std::size_t at; (at = reply.find(kObjectReplacement)) != std::string::npos;)
-    reply.replace(at, sizeof kObjectReplacement - 1, " ");
-  const TavroText markup(TAVRO_ADOPT(elm_entry_utf8_to_markup(reply.c_str())));
+  std::string text;
+  std::size_t from = 0;
+  for (std::size_t at; (at = reply.find(kObjectReplacement, from)) != std::string::npos;
+       from = at + sizeof kObjectReplacement - 1)
+    text.append(reply, from, at - from) += ' ';
+  text.append(reply, from);
+  const TavroText markup(TAVRO_ADOPT(elm_entry_utf8_to_markup(text.c_str())));
   return markup ? markup.get() : "";
 }
 

@@ -3,6 +3,7 @@
 #include <gmock/gmock.h>
 
 #include <algorithm>
+#include <cstdint>
 #include <fstream>
 #include <random>
 #include <sstream>
@@ -123,21 +124,25 @@ TEST_F(MemoryTracker, HelpersPairEveryBlockWithItsRelease) {
 }
 
 TEST_F(MemoryTracker, ThreadsNeverShareASlot) {
-  constexpr int kThreads = 2, kBlocks = 400, kRounds = 5;
-  std::vector<std::vector<char>> blocks(kThreads, std::vector<char>(kBlocks));
+  constexpr std::uint64_t kThreads = 2, kBlocks = 400, kRounds = 5;
+  std::vector<std::vector<void *>> blocks(kThreads);
+  // Every other one differs in its highest bits alone, which puts these into one place of any index, and far
+  // more than fit there.
+  for (std::uint64_t i = 1; i <= kThreads * kBlocks; i++)
+    blocks[i % kThreads].push_back(reinterpret_cast<void *>(i << (i / kThreads % 2 ? 51 : 4)));
   const auto on_all_threads = [&](auto work) {
     std::vector<std::thread> threads;
     for (auto &own : blocks)
       threads.emplace_back([&own, work] {
-        for (char &block : own) work(&block);
+        for (void *block : own) work(block);
       });
     for (auto &thread : threads) thread.join();
   };
-  const auto insert = [](char *block) { tavro_mem_insert(block, 1, "a.cpp"); };
-  for (int round = 0; round < kRounds; round++) {
+  const auto insert = [](void *block) { tavro_mem_insert(block, 1, "a.cpp"); };
+  for (std::uint64_t round = 0; round < kRounds; round++) {
     on_all_threads(insert);
     ASSERT_THAT(report().back(), EndsWith("total leak = 800"));
-    on_all_threads([insert](char *block) {
+    on_all_threads([insert](void *block) {
       tavro_mem_remove(block, 2, "a.cpp");
       insert(block);
       tavro_mem_remove(block, 3, "a.cpp");

@@ -22,7 +22,7 @@ function(tavro_valgrind_test program left_out)
     ${VALGRIND} --quiet --leak-check=full --show-leak-kinds=definite,possible
     --errors-for-leak-kinds=definite,possible --error-exitcode=99
     $<TARGET_FILE:${program}> --gtest_filter=-${left_out})
-  set_tests_properties(${program}_valgrind PROPERTIES TIMEOUT 120)
+  set_tests_properties(${program}_valgrind PROPERTIES TIMEOUT 300)
   if(IS_DIRECTORY /dev/shm)
     set_tests_properties(${program}_valgrind PROPERTIES ENVIRONMENT TMPDIR=/dev/shm)
   endif()

@@ -1,5 +1,6 @@
 // What stands in the store's place is no store, or a damaged one.
 #include "store_world.h"
+#include "tavro_dbmgr_catalogue.h"
 
 namespace {
 
@@ -25,18 +26,14 @@ class StoreDamage : public StoreWorld {
     return file_contents(TAVRO_DBMGR_FILE);
   }
 
-  static std::string foreign_database() {
-    run("DROP TABLE IF EXISTS NOTES; CREATE TABLE NOTES(N TEXT); INSERT INTO NOTES VALUES('of another')");
-    for (const char *table :
-         {"ATTACHMENT", "TABLE_VOC", "TABLE_USER_PROFILE", "APP_CRASH", "APP_DATA", "TABLE_VOC_EXTENDED",
-          "TABLE_BETA_PROGRAM", "TABLE_BANNER", "TABLE_NOTIFICATIONS"})
-      run(std::string("DROP TABLE ") + table);
+  static std::string foreign_database(const char *sql) {
+    fs::remove(TAVRO_DBMGR_FILE);
+    run(sql);
     return file_contents(TAVRO_DBMGR_FILE);
   }
 
-  static std::string database_with_a_table_of_the_same_name() {
-    run("DROP TABLE TABLE_VOC; CREATE TABLE TABLE_VOC(VOC_ID INTEGER PRIMARY KEY, SOUND BLOB)");
-    return file_contents(TAVRO_DBMGR_FILE);
+  static std::string with_garbage_at(std::string contents, std::size_t page) {
+    return contents.replace(page * kPageBytes, kPageBytes, kPageBytes, '\x55');
   }
 
   static void put_in_place(const std::string &contents) {
@@ -67,8 +64,9 @@ TEST_F(StoreDamage, WhatIsNoStoreIsKeptUnderADatedNameWithItsJournal) {
       {"truncated", whole.substr(0, whole.size() / 2)},
       {"truncated within the first page", whole.substr(0, 1000)},
       {"whole header, then garbage", garbage_pages},
-      {"a database with a table of the same name", database_with_a_table_of_the_same_name()},
-      {"another program's database", foreign_database()},
+      {"another program's database", foreign_database("CREATE TABLE NOTES(N); INSERT INTO NOTES VALUES(1)")},
+      {"with a table named like ours", foreign_database("CREATE TABLE ATTACHMENT(X); CREATE TABLE MINE(Y)")},
+      {"and a column too", foreign_database("CREATE TABLE TABLE_VOC(VOC_ID INTEGER PRIMARY KEY, Z)")},
   };
   for (const auto &[name, contents] : files) {
     SCOPED_TRACE(name);
@@ -83,11 +81,13 @@ TEST_F(StoreDamage, WhatIsNoStoreIsKeptUnderADatedNameWithItsJournal) {
   }
 }
 
-TEST_F(StoreDamage, FolderInTheStoresPlaceIsKeptAside) {
+TEST_F(StoreDamage, FolderInTheStoresPlaceIsKeptAsideWithSqlitesFiles) {
   fs::remove(TAVRO_DBMGR_FILE);
   fs::create_directories(TAVRO_DBMGR_FILE "/inside");
+  for (const char *ending : {"-wal", "-shm"}) std::ofstream(TAVRO_DBMGR_FILE + std::string(ending)) << "x";
   expect_replaced_once();
-  EXPECT_TRUE(fs::exists(file_set_aside() + "/inside"));
+  for (const char *part : {"/inside", "-wal", "-shm"})
+    EXPECT_TRUE(fs::exists(file_set_aside() + part)) << part;
 }
 
 TEST_F(StoreDamage, FileWithoutContentsBecomesAStore) {
@@ -97,16 +97,59 @@ TEST_F(StoreDamage, FileWithoutContentsBecomesAStore) {
   EXPECT_EQ(save_problem("user", "after"), 1);
 }
 
-TEST_F(StoreDamage, PageThatAnOperationCannotReadHasTheStoreReplacedAtTheNextStart) {
-  std::string damaged = whole_store();
-  const auto leaf = static_cast<std::size_t>(
-      std::stoi(value("SELECT rootpage FROM sqlite_master WHERE name = 'VOC_EXTENDED_BY_VOC'")));
-  damaged.replace((leaf - 1) * kPageBytes, kPageBytes, kPageBytes, '\x55');
-  put_in_place(damaged);
+TEST_F(StoreDamage, PageOfATableThatAnOperationCannotReadHasTheStoreReplacedAtTheNextStart) {
+  const std::string whole = whole_store();
+  put_in_place(with_garbage_at(whole, whole.find(TAVRO_DBMGR_BUG_REPORT) / kPageBytes));
   ASSERT_EQ(tavro_dbmgr_ensure_schema(), TAVRO_STORE_READY) << "found too early: choose another page";
-  save_problem("user", "meets the page");
+  for (int id = 1; id <= 8; id++) Voc(tavro_dbmgr_get_voc_by_id(id));
   ASSERT_TRUE(fs::exists(kMark));
   expect_replaced_once();
+}
+
+TEST_F(StoreDamage, DamageOutsideTheTablesIsHealedWithoutLoss) {
+  run("CREATE TABLE ADDED_LATER(\"it's\"); INSERT INTO ADDED_LATER VALUES('later')");
+  const std::string whole = whole_store();
+  const auto page_of = [](const char *name) {
+    return std::stoul(
+        value(std::string("SELECT rootpage - 1 FROM sqlite_master WHERE name = '") + name + "'"));
+  };
+  std::vector<std::string> stores;
+  for (const char *index : {"VOC_EXTENDED_BY_VOC", "VOC_BY_USER_AND_CHANGE", "sqlite_autoindex_TABLE_VOC_1"})
+    stores.push_back(with_garbage_at(whole, page_of(index)));
+  run("DROP INDEX VOC_BY_USER_AND_CHANGE; CREATE INDEX VOC_BY_USER_AND_CHANGE ON "
+      "TABLE_VOC(VOC_USER_NAME, VOC_DATE_OF_UPDATION) WHERE VOC_ID <> 3; PRAGMA writable_schema = ON; "
+      "UPDATE sqlite_master SET sql = replace(sql, ' WHERE VOC_ID <> 3', '')");
+  const char *in_history =
+      "SELECT count(*) FROM TABLE_VOC INDEXED BY VOC_BY_USER_AND_CHANGE WHERE VOC_USER_NAME = 'user'";
+  ASSERT_EQ(value(in_history), "7");
+  stores.push_back(file_contents(TAVRO_DBMGR_FILE));
+  for (const std::string &contents : stores) {
+    SCOPED_TRACE(&contents - stores.data());
+    put_in_place(contents);
+    std::ofstream(kMark) << "";
+    EXPECT_EQ(tavro_dbmgr_ensure_schema(), TAVRO_STORE_READY);
+    EXPECT_FALSE(fs::exists(kMark));
+    EXPECT_EQ(file_set_aside(), "");
+    EXPECT_EQ(value("PRAGMA integrity_check"), "ok");
+    EXPECT_EQ(value(in_history), "8");
+    EXPECT_EQ(value("SELECT \"it's\" FROM ADDED_LATER"), "later");
+    EXPECT_EQ(value("SELECT count(*) FROM sqlite_master WHERE type = 'index' AND sql IS NOT NULL"), "3");
+    const Voc voc(tavro_dbmgr_get_voc_by_id(3));
+    EXPECT_STREQ(voc->description, std::string(9000, 'x').c_str());
+    EXPECT_EQ(g_slist_length(voc->attachments), 2u);
+    tavro_dbmgr_destroy_vocs_by_id(8);
+    EXPECT_EQ(save_problem("user", "after"), 9);
+  }
+}
+
+TEST_F(StoreDamage, DamageOfAnotherFileCastsNoSuspicionOnTheStore) {
+  const std::string other = TAVRO_DBMGR_FOLDER "/other.db";
+  std::ofstream(other) << "no database at all, and long enough to be told apart from one";
+  sqlite3 *db = nullptr;
+  ASSERT_EQ(tavro_dbmgr_db_open(&db, other.c_str()), 0);
+  EXPECT_EQ(_tavro_dbmgr_get_matching_record_count(db, "TABLE_VOC", nullptr), -1);
+  tavro_dbmgr_db_close(db);
+  EXPECT_FALSE(fs::exists(kMark));
 }
 
 TEST_F(StoreDamage, SuspicionThatIsNotConfirmedChangesNothing) {

@@ -1,6 +1,7 @@
 // A save that was interrupted at any moment is completed, once.
 #include "tavro_save_journal.h"
 
+#include <sys/resource.h>
 #include <sys/stat.h>
 
 #include <chrono>
@@ -12,6 +13,7 @@
 namespace {
 
 constexpr char kJournal[] = TAVRO_DBMGR_FOLDER "/.tavro.save";
+constexpr char kAbandoned[] = TAVRO_DBMGR_FOLDER "/.tavro.save.abandoned";
 constexpr char kText[] = "it's\n not \xff text \\ 'x' ";
 
 class SaveJournal : public StoreWorld {
@@ -112,6 +114,25 @@ TEST_F(SaveJournal, NoteThatWaitsIsNotReplaced) {
   EXPECT_EQ(tavro_journal_clear(-1), -1);
   EXPECT_EQ(tavro_journal_write(problem_report("o'user", "later").get()), -1);
   expect_whole(tavro_journal_recover());
+}
+
+TEST_F(SaveJournal, NoteThatCannotBeReadNowIsHeededLater) {
+  rlimit files = {};
+  getrlimit(RLIMIT_NOFILE, &files);
+  const rlimit none = {0, files.rlim_max};
+  for (const bool is_abandoned : {true, false}) {
+    ASSERT_EQ(tavro_journal_write(report().get()), 0);  // and holds the journal's lock from now on
+    if (is_abandoned) {
+      tavro_dbmgr_update_bug_report(report().get());
+      std::filesystem::rename(kJournal, kAbandoned);
+    }
+    setrlimit(RLIMIT_NOFILE, &none);
+    EXPECT_EQ(tavro_journal_recover(), 0);
+    setrlimit(RLIMIT_NOFILE, &files);
+    EXPECT_EQ(access(is_abandoned ? kAbandoned : kJournal, F_OK), 0);
+    EXPECT_EQ(tavro_journal_recover(), is_abandoned ? 0 : 2);
+    EXPECT_EQ(rows(), is_abandoned ? "0/0/0" : "1/3/1");
+  }
 }
 
 TEST_F(SaveJournal, IdeaIsCompletedToo) {

@@ -96,17 +96,6 @@ TEST_F(StoreSchema, SeveralProcessesMayCreateOrReplaceTheStoreAtOnce) {
   }
 }
 
-TEST_F(StoreSchema, KilledHolderGivesTheLockBack) {
-  const pid_t holder = start_holder();
-  EXPECT_EQ(lock_value(), 0);
-  kill(holder, SIGKILL);
-  end_of(holder);
-  ASSERT_EQ(lock_value(), 1);
-  EXPECT_EQ(tavro_dbmgr_sem_wait(), 0);
-  EXPECT_EQ(tavro_dbmgr_sem_signal(), 0);
-  EXPECT_EQ(lock_value(), 1);
-}
-
 TEST_F(StoreSchema, StartOfTheClientSetsTheLockFreeAndThatOfTheServiceLeavesIt) {
   set_lock_value(5);
   EXPECT_EQ(tavro_dbmgr_init_semaphore(), 0);

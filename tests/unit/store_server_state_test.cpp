@@ -22,8 +22,10 @@ TEST_F(StoreServerState, AnswersAccumulateAndMarkTheReportUnread) {
       {"4", "ticket #5 it's <b> & done", "12#2#3#4",
        "none#We look at it#none#ticket  5 it&apos;s &lt;b&gt; &amp; done"},
       {nullptr, "x", "12#2#3#4#", "none#We look at it#none#ticket  5 it&apos;s &lt;b&gt; &amp; done#x"},
-      {"4", "a\xef\xbf\xbc" "b", "12#2#3#4##4",
-       "none#We look at it#none#ticket  5 it&apos;s &lt;b&gt; &amp; done#x#a b"},
+      {"4",
+       "a\xef\xbf\xbc"
+       "b",
+       "12#2#3#4##4", "none#We look at it#none#ticket  5 it&apos;s &lt;b&gt; &amp; done#x#a b"},
   };
   const int id = save_problem("user", "text");
   EXPECT_EQ(tavro_dbmgr_get_unread_push_notification_count("user"), 0);
