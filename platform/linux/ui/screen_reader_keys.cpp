@@ -109,7 +109,7 @@ gint16 x_modifiers(unsigned int modifiers) {
 bool is_printable(const char *text) {
   constexpr unsigned char kDelete = 0x7f;
   const unsigned char first = text ? static_cast<unsigned char>(*text) : 0;
-  return first >= ' ' && first != kDelete;
+  return first >= ' ' && first != kDelete && g_utf8_validate(text, -1, nullptr);
 }
 
 GVariant *description_of(const HeldKey &key) {
