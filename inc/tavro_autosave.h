@@ -7,10 +7,12 @@
 
 struct appdata;
 
-void tavro_autosave_start(appdata *ad);
+// `end_unchanged` ends the open screen unless that would lose something, and tells whether it has.
+using tavro_end_unchanged = bool (*)(appdata *ad);
+void tavro_autosave_start(appdata *ad, tavro_end_unchanged end_unchanged);
 void tavro_autosave_stop();
 
-// The application ends and nobody can be asked: what is on an open compose screen becomes a draft.
+// The application ends and nobody can be asked: what would be lost of an open compose screen becomes a draft.
 void tavro_autosave_at_end(appdata *ad);
 
 // The platform's report of a new battery capacity; `value` carries the percentage, `user_data` is the

@@ -31,6 +31,10 @@ bool tavro_compose_has_content(const appdata *ad);
 // Size of a file that can be attached, in bytes; -1 when it is gone, not a plain file or not readable.
 gint64 tavro_attachment_size(const char *path);
 
+// A report takes 32 files on its way to support; device status, system log and crash dump may be three of
+// them.
+constexpr unsigned kMostAttachments = 29;
+
 // Why a file cannot be attached. Pictures (JPEG, PNG) and videos (MP4) are told by what they hold.
 enum tavro_attachment_fault {
   TAVRO_ATTACHMENT_GOOD = 0,
@@ -38,8 +42,9 @@ enum tavro_attachment_fault {
   TAVRO_ATTACHMENT_EMPTY,
   TAVRO_ATTACHMENT_TOO_LARGE,  // by itself larger than the limit of a whole report
   TAVRO_ATTACHMENT_OTHER_KIND,
+  TAVRO_ATTACHMENT_TOO_MANY,  // kMostAttachments are attached
 };
-tavro_attachment_fault tavro_attachment_check(const char *path);
+tavro_attachment_fault tavro_attachment_check(const compose_view_win *view, const char *path);
 
 // Attach a file unless it is attached already; false when it cannot be attached. Keeps `buffer`.
 bool tavro_compose_attach(compose_view_win *view, const char *path);

@@ -12,18 +12,15 @@
 
 struct appdata;
 
-// The open compose screen is the one to be kept from now on.
+// The open compose screen is the one to be kept from now on. Closes a question that came up before it.
 void tavro_compose_keeper_start(appdata *ad);
 
 // Something changed: it is written within two seconds, and at most once in two seconds.
 void tavro_compose_keeper_note();
 
-// Write now what is not written yet: the application pauses, or another one comes to the front.
+// Write now what is not written yet, safe from a power cut at once: the application pauses, or another one
+// comes to the front.
 void tavro_compose_keeper_flush();
 
 // The content is stored or discarded: forget it, here and on disk.
 void tavro_compose_keeper_forget();
-
-// What an earlier run left behind, offered to the person once in a popup (go on writing, keep as a draft,
-// discard). Nothing when there is none, when a compose screen is open, or without a window.
-void tavro_compose_keeper_offer(appdata *ad);

@@ -5,6 +5,8 @@
 #include <Elementary.h>
 #include <glib.h>
 
+#include <string>
+
 struct appdata;
 struct compose_view_win;
 
@@ -12,6 +14,8 @@ struct compose_view_win;
 void tavro_compose_strip_build(appdata *ad, compose_view_win *view, Evas_Object *box);
 // Build the row of the crash dump, when the screen holds one.
 void tavro_compose_dump_build(appdata *ad, Evas_Object *box);
+// Take the dump off the open screen.
+void tavro_compose_dump_remove(appdata *ad);
 
 // Show the open screen's attachments, dump and size as they are now.
 void tavro_compose_strip_refresh(appdata *ad);
@@ -23,8 +27,8 @@ void tavro_compose_strip_remove(appdata *ad, const char *path);
 void tavro_compose_size_refresh(appdata *ad);
 
 // Attach files to the open screen; those that cannot be attached are named in a popup, each with the reason.
-// `paths` is a list of const char *.
-void tavro_compose_attach_files(appdata *ad, const GSList *paths);
+// `paths` is a list of const char *; `left_out` is shown with them, for what could not even be tried.
+void tavro_compose_attach_files(appdata *ad, const GSList *paths, const std::string &left_out = "");
 
 // What can be attached, and what can be done with one attachment, as menus at the foot of the screen.
 void tavro_compose_show_sources(appdata *ad);

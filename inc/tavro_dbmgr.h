@@ -213,6 +213,8 @@ int tavro_dbmgr_get_voc_count(const char *user_name);
 int tavro_dbmgr_is_voc_present(int server_id);
 // 1 when the lookup ran, whether or not it found the name; -1 for null and on failure.
 int tavro_dbmgr_check_if_dump_file_is_uploaded(const char *dump_name);
+// 1 when a report of whichever user has this system log, 0 when none has; -1 for null and on failure.
+int tavro_dbmgr_is_syslog_file_stored(const char *path);
 
 // One column of one row as a new text; null when there is no row or no value.
 char *tavro_dbmgr_get_voc_title_description_by_id(int voc_id);

@@ -22,6 +22,11 @@ void tavro_refresh_account_page_items(appdata *ad);
 // gone. Otherwise it is brought before the person with the question what to do with it.
 bool tavro_leave_compose_page(appdata *ad);
 
+// What an earlier run left of a compose screen, offered in a popup (go on writing, keep as a draft, discard)
+// once for each landing page, and again when a compose screen came up under it. Nothing when there is none,
+// when another page is in front, or without a window.
+void tavro_compose_keeper_offer(appdata *ad);
+
 // Compose screens. A non-null draft fills the screen and sets id_to_delete.
 void tavro_create_problem_page(appdata *ad, const svc_voc_data *draft);
 void tavro_create_idea_page(appdata *ad, const svc_voc_data *draft);

@@ -24,7 +24,8 @@ void tavro_system_log_watch(tavro_system_log_changed changed);
 
 tavro_system_log_state tavro_system_log_current(const appdata *ad);
 
-// Ask for the log of the open problem screen. Nothing when it is there or under way.
+// Ask for the log of the open problem screen; before, old logs that no stored report needs are deleted.
+// Nothing when it is there or under way.
 void tavro_system_log_collect(appdata *ad);
 
 // Give the log up: an answer that is still to come is thrown away, a file that was collected for this screen

@@ -6,6 +6,7 @@ set(TAVRO_CLIENT_CORE
   tavro_autosave.cpp
   tavro_compose_keeper.cpp
   tavro_compose_kept.cpp
+  tavro_compose_state.cpp
   tavro_crash_service.cpp
   tavro_device_status.cpp
   tavro_drafts.cpp
@@ -14,6 +15,7 @@ set(TAVRO_CLIENT_CORE
   tavro_history_text.cpp
   tavro_lifecycle.cpp
   tavro_log_archive.cpp
+  tavro_log_folder.cpp
   tavro_not_yet.cpp
   tavro_notifications.cpp
   tavro_preferences.cpp

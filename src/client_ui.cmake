@@ -21,7 +21,6 @@ set(TAVRO_CLIENT_UI
   tavro_compose_end.cpp
   tavro_compose_log.cpp
   tavro_compose_send.cpp
-  tavro_compose_state.cpp
   tavro_compose_strip.cpp
   tavro_compose.cpp
   tavro_compose_offer.cpp

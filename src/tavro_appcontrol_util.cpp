@@ -5,7 +5,6 @@
 
 #include "tavro-main.h"
 #include "tavro_appdata.h"
-#include "tavro_compose_keeper.h"
 #include "tavro_log.h"
 #include "tavro_memory.h"
 #include "tavro_not_yet.h"
@@ -13,6 +12,7 @@
 #include "tavro_push_handlers.h"
 #include "tavro_recovery.h"
 #include "tavro_request.h"
+#include "tavro_screens.h"
 #include "tavro_service_bridge.h"
 #include "tavro_service_events.h"
 #include "tavro_start.h"

@@ -3,6 +3,7 @@
 #include <cstdint>
 
 #include "tavro-main.h"
+#include "tavro_compose.h"
 #include "tavro_compose_keeper.h"
 #include "tavro_dbmgr.h"
 #include "tavro_drafts.h"
@@ -14,26 +15,23 @@ constexpr int kFirstSavePercent = 15;
 constexpr int kSaveAlwaysBelowPercent = 6;
 constexpr int kAutoSaveUnderWay = -1;
 
-// The screen that is open for the kind of report; null when none is.
-const compose_view_win *_open_view(const appdata *ad) {
-  if (ad->type == PROBLEM || ad->type == CRASH) return ad->problem_view;
-  return ad->type == IDEA ? static_cast<const compose_view_win *>(ad->idea_view) : nullptr;
-}
+// Of the open screen; null: it does not tell.
+tavro_end_unchanged _end_unchanged = nullptr;
 
 bool _entry_is_empty(const Evas_Object *entry) {
   return !entry || elm_entry_is_empty(entry);
 }
 
 bool _has_something_to_save(const appdata *ad, const compose_view_win *view) {
-  const bool has_log = ad->type != IDEA && ad->problem_view->syslog_filepath;
+  const bool has_log = ad->problem_view && ad->problem_view->syslog_filepath;
   return has_log || view->attachments || !_entry_is_empty(view->entry) || !_entry_is_empty(view->title_entry);
 }
 
 // An earlier copy stays the current one when its successor cannot be stored.
 void _save_draft(appdata *ad) {
   const int earlier_id = ad->auto_saved_id;
-  const int id = ad->type == IDEA ? tavro_save_idea_compose_data(ad, TAVRO_STATUS_DRAFT_SAVED)
-                                  : tavro_save_problem_compose_data(ad, TAVRO_STATUS_DRAFT_SAVED);
+  const int id = ad->idea_view ? tavro_save_idea_compose_data(ad, TAVRO_STATUS_DRAFT_SAVED)
+                               : tavro_save_problem_compose_data(ad, TAVRO_STATUS_DRAFT_SAVED);
   if (id >= 1 || earlier_id < 1) ad->auto_saved_id = id;
   TAVRO_LOGD("ad->auto_saved_id: %d", ad->auto_saved_id);
   tavro_compose_keeper_note();
@@ -42,7 +40,8 @@ void _save_draft(appdata *ad) {
 
 }  // namespace
 
-void tavro_autosave_start(appdata *ad) {
+void tavro_autosave_start(appdata *ad, tavro_end_unchanged end_unchanged) {
+  _end_unchanged = end_unchanged;
   const int ret =
       device_add_callback(DEVICE_CALLBACK_BATTERY_CAPACITY, __tavro_app_battery_capacity_changed_cb, ad);
   if (ret != DEVICE_ERROR_NONE && ret != DEVICE_ERROR_ALREADY_IN_PROGRESS) {
@@ -51,18 +50,21 @@ void tavro_autosave_start(appdata *ad) {
 }
 
 void tavro_autosave_stop() {
+  _end_unchanged = nullptr;
   device_remove_callback(DEVICE_CALLBACK_BATTERY_CAPACITY, __tavro_app_battery_capacity_changed_cb);
 }
 
 void tavro_autosave_at_end(appdata *ad) {
-  const compose_view_win *view = _open_view(ad);
-  if (view && _has_something_to_save(ad, view)) tavro_save_compose_draft(ad);
+  const compose_view_win *view = tavro_compose_view(ad);
+  if (!view) return;
+  const bool has_nothing = _end_unchanged ? _end_unchanged(ad) : !_has_something_to_save(ad, view);
+  if (!has_nothing) tavro_save_compose_draft(ad);
 }
 
 void __tavro_app_battery_capacity_changed_cb(device_callback_e type, void *value, void *user_data) {
   auto *ad = static_cast<appdata *>(user_data);
   const int capacity = static_cast<int>(reinterpret_cast<intptr_t>(value));
-  const compose_view_win *view = _open_view(ad);
+  const compose_view_win *view = tavro_compose_view(ad);
   if (!view) return;
   TAVRO_LOGD("battery_capacity is [%d] [%d]", type, capacity);
   if (capacity > kFirstSavePercent) return;

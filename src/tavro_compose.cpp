@@ -63,17 +63,13 @@ void _send_clicked_cb(void *data, Evas_Object *, void *) {
   tavro_compose_send(static_cast<appdata *>(data));
 }
 
-void _show_what_is_sent(appdata *ad) {
-  if (tavro_compose_view(ad)) tavro_create_review_page(ad, tavro_compose_send_from_review);
-}
-
 void _menu_clicked_cb(void *data, Evas_Object *, void *) {
   appdata *ad = static_cast<appdata *>(data);
   compose_view_win *view = tavro_compose_view(ad);
   if (!view) return;
   tavro_menu_show(ad, &view->menu_popup,
                   {{tavro_text("IDS_OB_BUTTON_SAVE_DRAFT"), tavro_compose_save_draft},
-                   {tavro_text("IDS_OB_HEADER_WHAT_IS_SENT"), _show_what_is_sent},
+                   {tavro_text("IDS_OB_HEADER_WHAT_IS_SENT"), tavro_compose_review},
                    {tavro_text("IDS_OB_BUTTON_DISCARD"), tavro_compose_discard}});
 }
 
@@ -109,10 +105,12 @@ void _fill_from_draft(compose_view_win *view, const svc_voc_data *draft) {
   elm_entry_entry_set(view->title_entry, tavro_markup(draft->title_description).c_str());
   for (const GSList *link = draft->attachments; link; link = link->next) {
     const char *path = static_cast<const tavro_dbmgr_attachment_info *>(link->data)->file_path;
+    if (!path) continue;  // of a damaged record
     // One that cannot be read just now stays attached: support is told its name if it is gone for good.
     if (!tavro_compose_attach(view, path))
       view->attachments = g_slist_append(view->attachments, TAVRO_STRDUP(path));
   }
+  tavro_compose_count(view);  // with those that are there but cannot be attached anew
 }
 
 Evas_Object *_build_content(appdata *ad, compose_view_win *view, const char *hint) {
@@ -165,7 +163,7 @@ void _build_page(appdata *ad, compose_view_win *view, const svc_voc_data *draft,
   evas_object_smart_callback_add(ad->nf, "transition,finished", _focus_title_cb, ad);
   for (Evas_Object *entry : {view->title_entry, view->entry})
     evas_object_smart_callback_add(entry, "changed", _typed_cb, nullptr);
-  tavro_autosave_start(ad);
+  tavro_autosave_start(ad, tavro_compose_end_unchanged);
   tavro_compose_keeper_start(ad);
 }
 
@@ -186,7 +184,7 @@ void _take_files(problem_view_win *view, const svc_voc_data *draft) {
 
 void tavro_create_problem_page(appdata *ad, const svc_voc_data *draft) {
   if (!tavro_leave_compose_page(ad)) return;
-  ad->type = ad->type == CRASH ? CRASH : PROBLEM;
+  ad->type = draft && ad->type == CRASH ? CRASH : PROBLEM;
   ad->problem_view = TAVRO_ZALLOC(problem_view_win);
   if (draft) _take_files(ad->problem_view, draft);
   _build_page(ad, ad->problem_view, draft, tavro_text("IDS_OB_HEADER_REPORT_A_PROBLEM"),

@@ -19,6 +19,10 @@ namespace {
 std::string _chosen;
 
 std::string _refusal(const char *path, tavro_attachment_fault fault) {
+  if (fault == TAVRO_ATTACHMENT_TOO_MANY) {
+    const TavroGText text(g_strdup_printf(tavro_text("IDS_OB_BODY_FILES_PD_AT_MOST"), kMostAttachments));
+    return tavro_file_name(path) + ": " + text.get();
+  }
   const char *reason = fault == TAVRO_ATTACHMENT_UNREADABLE  ? "IDS_OB_BODY_FILE_UNREADABLE"
                        : fault == TAVRO_ATTACHMENT_EMPTY     ? "IDS_OB_BODY_FILE_EMPTY"
                        : fault == TAVRO_ATTACHMENT_TOO_LARGE ? "IDS_OB_BODY_FILE_PS_MB_LIMIT"
@@ -77,14 +81,14 @@ void _remove(appdata *ad) {
 
 }  // namespace
 
-void tavro_compose_attach_files(appdata *ad, const GSList *paths) {
+void tavro_compose_attach_files(appdata *ad, const GSList *paths, const std::string &left_out) {
   compose_view_win *view = tavro_compose_view(ad);
   if (!view) return;
-  std::string refused;
+  std::string refused = left_out;
   for (const GSList *link = paths; link; link = link->next) {
     const char *path = static_cast<const char *>(link->data);
     if (tavro_compose_attach(view, path)) continue;
-    refused += (refused.empty() ? "" : "\n") + _refusal(path, tavro_attachment_check(path));
+    refused += (refused.empty() ? "" : "\n") + _refusal(path, tavro_attachment_check(view, path));
   }
   tavro_compose_strip_refresh(ad);
   if (!refused.empty())

@@ -8,6 +8,7 @@
 #include "tavro_compose_keeper.h"
 #include "tavro_compose_parts.h"
 #include "tavro_dbmgr.h"
+#include "tavro_report_files.h"
 #include "tavro_screens.h"
 #include "tavro_system_log.h"
 
@@ -46,13 +47,16 @@ void _end_parts(appdata *ad) {
 }
 
 // The screen ends without a new record: its automatic copy goes with it, and so does, when the person says
-// "discard", the draft that it was opened from.
+// "discard", the draft that it was opened from with its log.
 void _end_without_record(appdata *ad, bool with_draft) {
   tavro_compose_log_end();
   tavro_system_log_drop(ad);  // while the draft is known: its log stays its own
   tavro_system_log_end(ad);
   if (ad->auto_saved_id >= 1) tavro_dbmgr_destroy_vocs_by_id(ad->auto_saved_id);
-  if (with_draft && ad->id_to_delete >= 1) tavro_dbmgr_destroy_vocs_by_id(ad->id_to_delete);
+  if (with_draft && ad->id_to_delete >= 1) {
+    tavro_delete_syslog_file(ad->id_to_delete);
+    tavro_dbmgr_destroy_vocs_by_id(ad->id_to_delete);
+  }
   ad->auto_saved_id = 0;
   ad->id_to_delete = 0;
   tavro_autosave_stop();
@@ -75,10 +79,7 @@ void _ask_before_leaving(appdata *ad) {
 
 Eina_Bool _pop_cb(void *data, Elm_Object_Item *) {
   appdata *ad = static_cast<appdata *>(data);
-  if (!_would_lose_something(ad)) {
-    _end_without_record(ad, false);
-    return EINA_TRUE;
-  }
+  if (tavro_compose_end_unchanged(ad)) return EINA_TRUE;
   _ask_before_leaving(ad);
   return EINA_FALSE;
 }
@@ -111,6 +112,12 @@ void tavro_compose_forget_opened() {
   _opened = {};
 }
 
+bool tavro_compose_end_unchanged(appdata *ad) {
+  if (_would_lose_something(ad)) return false;
+  _end_without_record(ad, false);
+  return true;
+}
+
 void tavro_compose_guard(appdata *ad) {
   const compose_view_win *view = tavro_compose_view(ad);
   evas_object_event_callback_add(view->layout, EVAS_CALLBACK_DEL, _page_deleted_cb, ad);
@@ -135,7 +142,7 @@ void tavro_compose_save_draft(appdata *ad) {
 }
 
 void tavro_compose_discard(appdata *ad) {
-  if (_would_lose_something(ad))
+  if (_would_lose_something(ad) || ad->id_to_delete >= 1)
     _ask_before_leaving(ad);
   else
     _discard(ad);

@@ -1,6 +1,7 @@
 #include "tavro_compose_keeper.h"
 
 #include <Elementary.h>
+#include <notification.h>
 
 #include <algorithm>
 #include <cerrno>
@@ -8,6 +9,7 @@
 #include <ctime>
 #include <string>
 
+#include "tavro-common.h"
 #include "tavro-main.h"
 #include "tavro_compose_kept.h"
 #include "tavro_drafts.h"
@@ -29,6 +31,7 @@ struct kept_screen {
   std::string path;     // empty until there is something to keep
   std::string written;  // what the file holds
   Ecore_Timer *timer;   // null: nothing has changed since
+  bool is_synced;       // the file's name is safe on the disk too
   bool has_failed;      // the last write did, and was logged
 } _screen;
 
@@ -90,13 +93,19 @@ void _report(bool is_written, const char *reason) {
   _screen.has_failed = !is_written;
 }
 
+void _report_full() {
+  if (!_screen.has_failed) notification_status_message_post(tavro_text("IDS_OB_TPOP_TOO_MUCH_IS_KEPT"));
+  _report(false, "too much is kept already");
+}
+
 void _write_file(std::string data) {
   if (data == _screen.written) return;
   if (_screen.path.empty()) _screen.path = tavro_kept_unused_path();
-  if (_screen.path.empty()) return _report(false, "too much is kept already");
-  if (tavro_note_write(_screen.path.c_str(), data.data(), data.size()) != 0)
+  if (_screen.path.empty()) return _report_full();
+  if (tavro_note_replace(_screen.path.c_str(), data.data(), data.size()) != 0)
     return _report(false, std::strerror(errno));
   _report(true, nullptr);
+  _screen.is_synced = false;
   _screen.written = std::move(data);
 }
 
@@ -133,6 +142,8 @@ void tavro_compose_keeper_start(appdata *ad) {
   _screen.ad = ad;
   const compose_view_win *view = _open_view();
   if (!view) return _stop();
+  // A question that is still up is about something else, and its answer would meet this screen.
+  if (ad->cancel_popup) evas_object_del(ad->cancel_popup);
   _screen.begun = std::time(nullptr);
   _screen.opened = _said(_content(view));
   _screen.page = view->layout;
@@ -151,9 +162,13 @@ void tavro_compose_keeper_note() {
 }
 
 void tavro_compose_keeper_flush() {
-  if (!_screen.timer) return;
-  ecore_timer_del(_screen.timer);
-  _write_cb(nullptr);
+  if (_screen.timer) {
+    ecore_timer_del(_screen.timer);
+    _write_cb(nullptr);
+  }
+  if (_screen.written.empty() || _screen.is_synced) return;
+  _screen.is_synced = tavro_note_sync_folder(_screen.path.c_str()) == 0;
+  if (!_screen.is_synced) _report(false, std::strerror(errno));
 }
 
 void tavro_compose_keeper_forget() {

@@ -4,7 +4,6 @@
 #include <unistd.h>
 
 #include <cerrno>
-#include <cstdio>
 #include <cstdlib>
 #include <cstring>
 
@@ -17,7 +16,7 @@
 namespace {
 
 // More than a person leaves behind; without a limit a fault elsewhere could fill the disk.
-constexpr int kMostFiles = 16;
+constexpr int kMostFiles = 100;
 constexpr off_t kLargestFileBytes = 64 * 1024 * 1024;
 constexpr char kDamagedPath[] = TAVRO_COMPOSE_KEEPER_FILE ".damaged";
 constexpr gint64 kMillisecondsPerSecond = 1000;
@@ -75,13 +74,11 @@ const char *_read(GKeyFile *file, kept_writing *kept) {
   kept->auto_saved_id = g_key_file_get_integer(file, kGroup, kAutoSaved, nullptr);
   kept->begun = g_key_file_get_int64(file, kGroup, kBegun, nullptr);
   kept->is_device_status_removed = g_key_file_get_boolean(file, kGroup, kNoDeviceStatus, nullptr);
-  return nullptr;
+  return tavro_kept_says_something(*kept) ? nullptr : "no content";
 }
 
 std::nullopt_t _set_aside(const std::string &path, const char *reason) {
-  TAVRO_LOGE("what was being written is damaged, kept as %s: %s", kDamagedPath, reason);
-  if (std::rename(path.c_str(), kDamagedPath) == -1)
-    TAVRO_LOGE("%s stays: %s", path.c_str(), std::strerror(errno));
+  tavro_note_set_aside(path.c_str(), kDamagedPath, reason);
   return std::nullopt;
 }
 
@@ -141,10 +138,8 @@ std::optional<kept_writing> tavro_kept_load(const std::string &path) {
   struct stat info = {};
   if (lstat(path.c_str(), &info) == -1) return std::nullopt;
   if (!S_ISREG(info.st_mode) || info.st_size > kLargestFileBytes) return _set_aside(path, "not of ours");
-  const TavroKeyFile file(g_key_file_new());
-  TavroError error;
-  if (!g_key_file_load_from_file(file.get(), path.c_str(), G_KEY_FILE_NONE, tavro_out(error)))
-    return _set_aside(path, error->message);
+  const TavroKeyFile file = tavro_note_load(path.c_str(), kDamagedPath);
+  if (!file) return std::nullopt;
   kept_writing kept;
   const char *reason = _read(file.get(), &kept);
   if (reason) return _set_aside(path, reason);

@@ -23,13 +23,14 @@ struct kept_writing {
 // The bytes of a file.
 std::string tavro_kept_data(const kept_writing &kept);
 
-// Nothing when the file is missing, or damaged: then it is set aside with a log line.
+// Nothing when the file is missing; when it is damaged or says nothing: then it is set aside; and when it
+// cannot be read now: then it stays. The last two with a log line.
 std::optional<kept_writing> tavro_kept_load(const std::string &path);
 
 // The content is stored or discarded.
 void tavro_kept_remove(const std::string &path);
 
-// The files that are there, oldest place first.
+// The files that are there, in the order of their places.
 std::vector<std::string> tavro_kept_paths();
 // A path for one more; empty when there are too many.
 std::string tavro_kept_unused_path();

@@ -30,9 +30,8 @@ bool _is_mandatory(const appdata *ad) {
 
 // A log whose file has vanished is as good as none.
 tavro_system_log_state _state(const appdata *ad) {
-  const char *path = ad->problem_view->syslog_filepath;
-  if (path) return tavro_attachment_size(path) >= 0 ? TAVRO_SYSTEM_LOG_READY : TAVRO_SYSTEM_LOG_FAILED;
-  return tavro_system_log_current(ad);
+  const tavro_system_log_state state = tavro_system_log_current(ad);
+  return state == TAVRO_SYSTEM_LOG_OFF && ad->problem_view->syslog_filepath ? TAVRO_SYSTEM_LOG_FAILED : state;
 }
 
 std::string _state_text(const appdata *ad) {

@@ -8,7 +8,6 @@
 #include "tavro-main.h"
 #include "tavro_appdata.h"
 #include "tavro_compose.h"
-#include "tavro_compose_keeper.h"
 #include "tavro_compose_kept.h"
 #include "tavro_compose_parts.h"
 #include "tavro_log.h"
@@ -44,16 +43,20 @@ bool _is_of_user(const kept_writing &kept) {
   return g_strcmp0(user_name.get(), kept.content->user_name) == 0;
 }
 
+std::string _first_line(const char *text) {
+  std::string line = text ? text : "";
+  line.erase(0, line.find_first_not_of(" \t\r\n"));
+  return line.substr(0, line.find('\n'));
+}
+
 // Its first words; the name of a file where there are none.
 std::string _first_words(const kept_writing &kept) {
   const svc_voc_data &content = *kept.content;
-  std::string words;
-  for (const char *text : {content.description, content.title_description})
-    if (text && *text) words = text;
+  std::string words = _first_line(content.title_description);
+  if (words.empty()) words = _first_line(content.description);
   if (words.empty() && content.attachments)
     words = tavro_file_name(
         static_cast<const tavro_dbmgr_attachment_info *>(content.attachments->data)->file_path);
-  words = words.substr(0, words.find('\n'));
   if (g_utf8_strlen(words.c_str(), -1) <= kShownCharacters) return words;
   return words.substr(0, static_cast<size_t>(g_utf8_offset_to_pointer(words.c_str(), kShownCharacters) -
                                              words.c_str())) +
@@ -62,8 +65,10 @@ std::string _first_words(const kept_writing &kept) {
 
 // ---- What the person decides ----
 
-// The screen as it was, with everything on it still to be stored.
+// The screen as it was, with everything on it still to be stored. False, with nothing changed, while another
+// screen holds something to lose.
 bool _reopen(appdata *ad) {
+  if (!tavro_leave_compose_page(ad)) return false;
   const std::optional<kept_writing> kept = _load(_offered_path);
   if (!kept) return false;
   ad->type = kept->type;
@@ -103,7 +108,7 @@ void _keep_as_draft(appdata *ad) {
     // A page that was pushed just now does not take being popped.
     if (!tavro_compose_view(ad) && elm_naviframe_top_item_get(ad->nf) == page) elm_object_item_del(page);
   }
-  if (!tavro_compose_view(ad)) _offer_next(ad);
+  _offer_next(ad);
 }
 
 // As from its screen, except that a draft it was opened from stays as it was last stored.
@@ -112,16 +117,25 @@ void _discard(appdata *ad) {
   _offer_next(ad);
 }
 
+// Without an answer because a compose screen came up: there will be another occasion.
+void _offer_closed_cb(void *data, Evas *, Evas_Object *, void *) {
+  if (tavro_compose_view(static_cast<appdata *>(data))) _offered_on = nullptr;
+}
+
 void _offer(appdata *ad, const std::string &path, const kept_writing &kept) {
   _offered_path = path;
   const std::string body = std::string(tavro_text("IDS_OB_BODY_GO_ON_WRITING")) + "\n\n" + _first_words(kept);
-  tavro_popup_show(ad, &ad->cancel_popup, tavro_text("IDS_OB_HEADER_GO_ON_WRITING"), body.c_str(),
-                   {{tavro_text("IDS_OB_BUTTON_DISCARD"), _discard},
-                    {tavro_text("IDS_OB_BUTTON_KEEP_AS_DRAFT"), _keep_as_draft},
-                    {tavro_text("IDS_OB_BUTTON_GO_ON"), _go_on}});
+  Evas_Object *popup =
+      tavro_popup_show(ad, &ad->cancel_popup, tavro_text("IDS_OB_HEADER_GO_ON_WRITING"), body.c_str(),
+                       {{tavro_text("IDS_OB_BUTTON_DISCARD"), _discard},
+                        {tavro_text("IDS_OB_BUTTON_KEEP_AS_DRAFT"), _keep_as_draft},
+                        {tavro_text("IDS_OB_BUTTON_GO_ON"), _go_on}});
+  if (popup) evas_object_event_callback_add(popup, EVAS_CALLBACK_DEL, _offer_closed_cb, ad);
 }
 
+// Nothing while a screen is open: one of the files is its own.
 void _offer_next(appdata *ad) {
+  if (tavro_compose_view(ad)) return;
   for (const std::string &path : tavro_kept_paths()) {
     const std::optional<kept_writing> kept = _load(path);
     if (kept && _is_of_user(*kept)) return _offer(ad, path, *kept);

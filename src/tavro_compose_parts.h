@@ -13,10 +13,14 @@ struct problem_view_win;
 void tavro_compose_remember_opened(appdata *ad);
 // Nothing of what the open screen holds is stored: leaving it always asks.
 void tavro_compose_forget_opened();
+// End the open screen unless that would lose something; whether it has ended. Its automatic copy and a log
+// that came by itself go with it, a draft that it was opened from stays.
+bool tavro_compose_end_unchanged(appdata *ad);
 // Ask before the pushed page is left with something to lose, by whatever road.
 void tavro_compose_guard(appdata *ad);
 void tavro_compose_save_draft(appdata *ad);
-// "Discard" of the menu: asks when there is something to lose.
+// "Discard" of the menu: asks when there is something to lose, be it only the draft that the screen was
+// opened from.
 void tavro_compose_discard(appdata *ad);
 // Store the open screen with `save`, which ends it; when the store refuses, the person is told.
 void tavro_compose_finish(appdata *ad, int (*save)(appdata *ad));
@@ -25,7 +29,9 @@ void tavro_compose_finish(appdata *ad, int (*save)(appdata *ad));
 
 // The person wants the open screen's report to be sent. Nothing when its page is not in front.
 void tavro_compose_send(appdata *ad);
-// The same from the page of what is sent, where the person has just seen it.
+// "What is sent" of the menu: the page, from which the report can be sent.
+void tavro_compose_review(appdata *ad);
+// Send from the page of what is sent, where the person has just seen it.
 void tavro_compose_send_from_review(appdata *ad);
 // The system log has changed: a report that waits for it goes on.
 void tavro_compose_send_log_changed(appdata *ad);

@@ -20,7 +20,7 @@ namespace {
 Evas_Object *_waiting = nullptr;
 // The person has seen what is sent, should that not have been stored.
 bool _has_reviewed = false;
-// The person chose to send without the log this time.
+// The person chose to send without the log this time: until "Send" or "What is sent" is chosen anew.
 bool _goes_without_log = false;
 
 void _check_log(appdata *ad);
@@ -41,10 +41,16 @@ bool _is_complete(appdata *ad) {
   return false;
 }
 
-// ---- The last step, by way of "What is sent" the first time ----
+// ---- The last step, by way of "What is sent" the first time and for drafts ----
+
+// A draft does not remember that the device status was taken off, so it never goes unseen.
+bool _may_go_unseen(const appdata *ad) {
+  const bool is_draft_of_problem = ad->problem_view && ad->id_to_delete >= 1;
+  return !is_draft_of_problem && tavro_preference_flag(TAVRO_PREF_SENT_PAGE_SEEN, false);
+}
 
 void _send(appdata *ad) {
-  if (_has_reviewed || tavro_preference_flag(TAVRO_PREF_SENT_PAGE_SEEN, false))
+  if (_has_reviewed || _may_go_unseen(ad))
     tavro_compose_finish(ad, tavro_send_compose_data);
   else
     tavro_create_review_page(ad, tavro_compose_send_from_review);
@@ -143,6 +149,12 @@ void tavro_compose_send(appdata *ad) {
   if (!view || view->nf_it != elm_naviframe_top_item_get(ad->nf)) return;
   _goes_without_log = false;
   _begin(ad);
+}
+
+void tavro_compose_review(appdata *ad) {
+  if (!tavro_compose_view(ad)) return;
+  _goes_without_log = false;
+  tavro_create_review_page(ad, tavro_compose_send_from_review);
 }
 
 void tavro_compose_send_from_review(appdata *ad) {

@@ -48,6 +48,17 @@ GSList *_find(const compose_view_win *view, const char *path) {
   });
 }
 
+// Something to read: blanks alone are none.
+bool _has_words(const Evas_Object *entry) {
+  if (elm_entry_is_empty(entry)) return false;
+  const TavroText text(TAVRO_ADOPT(elm_entry_markup_to_utf8(elm_entry_entry_get(entry))));
+  for (const char *at = text.get(); at && *at; at = g_utf8_next_char(at)) {
+    const gunichar letter = g_utf8_get_char(at);
+    if (g_unichar_isgraph(letter) && !g_unichar_iszerowidth(letter)) return true;
+  }
+  return false;
+}
+
 gint64 _size_or_none(const char *path) {
   return path ? std::max<gint64>(tavro_attachment_size(path), 0) : 0;
 }
@@ -65,7 +76,7 @@ compose_view_win *tavro_compose_view(appdata *ad) {
 bool tavro_compose_has_content(const appdata *ad) {
   const compose_view_win *view = _open_view(ad);
   if (!view) return false;
-  return !elm_entry_is_empty(view->entry) || !elm_entry_is_empty(view->title_entry) || view->attachments ||
+  return _has_words(view->entry) || _has_words(view->title_entry) || view->attachments ||
          (ad->problem_view && ad->problem_view->dump_filepath);
 }
 
@@ -82,17 +93,19 @@ gint64 tavro_attachment_size(const char *path) {
   return info.st_size;
 }
 
-tavro_attachment_fault tavro_attachment_check(const char *path) {
+tavro_attachment_fault tavro_attachment_check(const compose_view_win *view, const char *path) {
   const gint64 size = tavro_attachment_size(path);
   if (size < 0 || _is_off_limits(path)) return TAVRO_ATTACHMENT_UNREADABLE;
   if (size == 0) return TAVRO_ATTACHMENT_EMPTY;
   if (size > tavro_attachment_size_limit()) return TAVRO_ATTACHMENT_TOO_LARGE;
-  return _is_known_kind(path) ? TAVRO_ATTACHMENT_GOOD : TAVRO_ATTACHMENT_OTHER_KIND;
+  if (!_is_known_kind(path)) return TAVRO_ATTACHMENT_OTHER_KIND;
+  return g_slist_length(view->attachments) < kMostAttachments ? TAVRO_ATTACHMENT_GOOD
+                                                              : TAVRO_ATTACHMENT_TOO_MANY;
 }
 
 bool tavro_compose_attach(compose_view_win *view, const char *path) {
   if (_find(view, path)) return true;
-  const tavro_attachment_fault fault = tavro_attachment_check(path);
+  const tavro_attachment_fault fault = tavro_attachment_check(view, path);
   if (fault != TAVRO_ATTACHMENT_GOOD) {
     TAVRO_LOGD("cannot attach %s: %d", path, fault);
     return false;

@@ -152,12 +152,8 @@ void _removed_cb(void *data) {
 // ---- The crash dump ----
 
 void _dump_removed_cb(void *data, Evas_Object *, void *) {
-  appdata *ad = static_cast<appdata *>(data);
-  if (!ad->problem_view) return;
-  TAVRO_FREE(ad->problem_view->dump_filename);
-  TAVRO_FREE(ad->problem_view->dump_filepath);
   // Not from inside the button's own callback.
-  ecore_job_add([](void *job_data) { tavro_compose_strip_refresh(static_cast<appdata *>(job_data)); }, ad);
+  ecore_job_add([](void *ad) { tavro_compose_dump_remove(static_cast<appdata *>(ad)); }, data);
 }
 
 void _refresh_dump(appdata *ad) {
@@ -207,6 +203,13 @@ void tavro_compose_dump_build(appdata *ad, Evas_Object *box) {
                                          name.c_str(), _dump_removed_cb, ad);
   elm_object_part_content_set(row, "elm.swallow.end", remove);
   elm_box_pack_end(box, row);
+}
+
+void tavro_compose_dump_remove(appdata *ad) {
+  if (!ad->problem_view) return;
+  TAVRO_FREE(ad->problem_view->dump_filename);
+  TAVRO_FREE(ad->problem_view->dump_filepath);
+  tavro_compose_strip_refresh(ad);
 }
 
 void tavro_compose_strip_refresh(appdata *ad) {

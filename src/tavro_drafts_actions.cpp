@@ -3,6 +3,7 @@
 
 #include <algorithm>
 #include <cstdio>
+#include <string>
 
 #include "tavro-common.h"
 #include "tavro-main.h"
@@ -13,6 +14,7 @@
 #include "tavro_drafts_save.h"
 #include "tavro_memory.h"
 #include "tavro_preferences.h"
+#include "tavro_report_files.h"
 #include "tavro_system_log.h"
 
 namespace {
@@ -53,6 +55,13 @@ int _save_by_kind(appdata *ad, int status) {
                           : tavro_drafts_save_problem(ad, status, on_failed_store::keep_screen);
 }
 
+// A draft goes with its log, unless the record that replaces it has the same one.
+void _destroy_replaced_draft(int draft, const std::string &kept_log) {
+  const TavroText log(tavro_dbmgr_get_voc_syslog_file_by_id(draft));
+  if (log && log.get() != kept_log) tavro_delete_syslog_file(draft);
+  tavro_dbmgr_destroy_vocs_by_id(draft);
+}
+
 // The draft that the screen came from and its automatic copy go when the new record is stored: a store that
 // refuses the record, or an end of the process in between, then loses neither.
 int _end_compose_screen(appdata *ad, int status) {
@@ -61,12 +70,14 @@ int _end_compose_screen(appdata *ad, int status) {
   const int auto_saved = ad->auto_saved_id;
   tavro_compose_keeper_flush();  // so that it is known for the same report if the process ends in between
   ad->auto_saved_id = 0;
+  const char *log_path = ad->problem_view ? ad->problem_view->syslog_filepath : nullptr;
+  const std::string log = log_path ? log_path : "";  // the record ends with the save
   const int id = _save_by_kind(ad, status);
   if (id < 1) {
     ad->auto_saved_id = auto_saved;
     return id;
   }
-  if (opened_from >= 1) tavro_dbmgr_destroy_vocs_by_id(opened_from);
+  if (opened_from >= 1) _destroy_replaced_draft(opened_from, log);
   if (auto_saved >= 1 && auto_saved != opened_from) tavro_dbmgr_destroy_vocs_by_id(auto_saved);
   tavro_compose_keeper_forget();
   tavro_system_log_end(ad);

@@ -127,6 +127,7 @@ void _build_grid(gallery_picker *picker) {
   picker->grid = elm_gengrid_add(picker->page);
   evas_object_event_callback_add(picker->grid, EVAS_CALLBACK_RESIZE, _fit_columns_cb, nullptr);
   _fit_columns_cb(nullptr, nullptr, picker->grid, nullptr);
+  elm_atspi_accessible_name_set(picker->grid, tavro_text("IDS_OB_HEADER_CHOOSE_PICTURES"));
   elm_gengrid_multi_select_set(picker->grid, EINA_TRUE);
   elm_gengrid_align_set(picker->grid, 0.0, 0.0);
   elm_scroller_policy_set(picker->grid, ELM_SCROLLER_POLICY_OFF, ELM_SCROLLER_POLICY_OFF);
@@ -144,6 +145,10 @@ void _build_bottom(gallery_picker *picker) {
   elm_object_part_content_set(picker->page, "tavro.swallow.bottom", bottom);
   elm_object_signal_emit(picker->page, "tavro,bottom", "tavro");
   _show_count(picker);
+  // Of itself the toolkit puts a button that was enabled later before the grid.
+  Evas_Object *back = elm_object_part_content_get(picker->page, "tavro.swallow.start");
+  for (Evas_Object *next : {back, picker->grid, bottom})
+    elm_object_focus_custom_chain_append(picker->page, next, nullptr);
 }
 
 int _compare_items(const void *left, const void *right) {

@@ -2,6 +2,7 @@
 #include <efl_extension.h>
 #include <elm_atspi.h>
 
+#include <algorithm>
 #include <cstring>
 
 #include "tavro-common.h"
@@ -13,9 +14,16 @@
 
 namespace {
 
+constexpr char kStateKey[] = "tavro,popup";
+constexpr int kSideUnits = 32;    // beside the column of a popup
+constexpr int kAroundUnits = 60;  // above and below it: the card's edge and what is left of the window
+constexpr int kButtonsGapUnits = 14;
+
 struct popup_state {
   Evas_Object **slot;
   tavro_focus_memory focus;  // where the keyboard was
+  // Of a popup with texts; `strut` gives these their width, `room` is as tall as what is seen of them.
+  Evas_Object *text, *strut, *room, *buttons;
 };
 
 struct button_state {
@@ -26,6 +34,7 @@ struct button_state {
 
 void _popup_deleted_cb(void *data, Evas *, Evas_Object *popup, void *) {
   popup_state *state = static_cast<popup_state *>(data);
+  evas_object_data_del(popup, kStateKey);
   if (*state->slot == popup) *state->slot = nullptr;
   // A popup that lies above this one keeps the focus.
   if (state->focus.widget && elm_object_focus_get(popup))
@@ -56,6 +65,7 @@ Evas_Object *_overlay_add(appdata *ad, Evas_Object **slot, const char *group) {
   elm_win_resize_object_add(ad->win, popup);
   popup_state *state = TAVRO_ZALLOC(popup_state);
   state->slot = slot;
+  evas_object_data_set(popup, kStateKey, state);
   tavro_focus_remember(&state->focus, ad->win);
   evas_object_event_callback_add(popup, EVAS_CALLBACK_DEL, _popup_deleted_cb, state);
   eext_object_event_callback_add(popup, EEXT_CALLBACK_BACK, eext_popup_back_cb, nullptr);
@@ -74,7 +84,7 @@ void _add_buttons(appdata *ad, Evas_Object *popup, Evas_Object *box, const char 
     state->clicked = button.clicked;
     Evas_Object *one = tavro_button_add(box, style, button.text, nullptr, nullptr, _button_clicked_cb, state);
     evas_object_event_callback_add(one, EVAS_CALLBACK_DEL, _button_deleted_cb, state);
-    evas_object_size_hint_align_set(one, has_lines ? EVAS_HINT_FILL : 0.5, 0.5);
+    evas_object_size_hint_align_set(one, has_lines ? EVAS_HINT_FILL : 1.0, 0.5);
     elm_box_pack_end(box, one);
     added.push_back(one);
   }
@@ -84,11 +94,67 @@ void _add_buttons(appdata *ad, Evas_Object *popup, Evas_Object *box, const char 
   if (!added.empty()) elm_object_focus_set(has_lines ? added.front() : added.back(), EINA_TRUE);
 }
 
-// Three buttons beneath each other are too many for a phone that lies on its side.
-bool _is_landscape(const Evas_Object *win) {
-  int width = 0, height = 0;
-  evas_object_geometry_get(win, nullptr, nullptr, &width, &height);
-  return width > height;
+int _units(int units) {
+  return static_cast<int>(units * elm_config_scale_get());
+}
+
+Evas_Object *_clear_rectangle_add(const Evas_Object *parent) {
+  Evas_Object *rectangle = evas_object_rectangle_add(evas_object_evas_get(parent));
+  evas_object_color_set(rectangle, 0, 0, 0, 0);
+  return rectangle;
+}
+
+// Buttons beside each other where their texts leave them the room, else beneath; returns their height.
+int _arrange_buttons(Evas_Object *box, int width) {
+  int beside = 0, beneath = 0, tallest = 0;
+  Eina_List *buttons = elm_box_children_get(box);
+  void *button = nullptr;
+  EINA_LIST_FREE(buttons, button) {
+    int least = 0, height = 0;
+    evas_object_size_hint_min_get(static_cast<Evas_Object *>(button), &least, &height);
+    beside += least;
+    beneath += height;
+    tallest = std::max(tallest, height);
+  }
+  elm_box_horizontal_set(box, beside <= width);
+  return beside <= width ? tallest : beneath;
+}
+
+// The window, a text or a button got another size: the texts wrap anew and scroll in what the buttons leave.
+void _fit_cb(void *popup, Evas *, Evas_Object *, void *) {
+  const popup_state *state =
+      static_cast<popup_state *>(evas_object_data_get(static_cast<Evas_Object *>(popup), kStateKey));
+  if (!state) return;  // the popup is going
+  int width = 0, height = 0, text_height = 0;
+  evas_object_geometry_get(static_cast<Evas_Object *>(popup), nullptr, nullptr, &width, &height);
+  width = std::max(1, width - _units(2 * kSideUnits));
+  const int buttons_height = _arrange_buttons(state->buttons, width);
+  evas_object_size_hint_min_set(state->strut, width, 0);
+  edje_object_size_min_restricted_calc(elm_layout_edje_get(state->text), nullptr, &text_height, width, 0);
+  const int left = std::max(1, height - _units(kAroundUnits + kButtonsGapUnits) - buttons_height);
+  evas_object_size_hint_min_set(state->room, 0, std::min(text_height, left));
+}
+
+// Texts that scroll, in a place that is as tall as _fit_cb() says.
+Evas_Object *_add_texts(popup_state *state, Evas_Object *column, const char *title, const char *body) {
+  Evas_Object *place = elm_table_add(column), *scroller = nullptr;
+  tavro_fill_width(place);
+  state->room = _clear_rectangle_add(place);
+  evas_object_size_hint_weight_set(state->room, EVAS_HINT_EXPAND, EVAS_HINT_EXPAND);
+  elm_table_pack(place, state->room, 0, 0, 1, 1);
+  Evas_Object *box = tavro_scrolled_box_add(place, &scroller);
+  evas_object_size_hint_align_set(scroller, EVAS_HINT_FILL, EVAS_HINT_FILL);
+  elm_object_focus_allow_set(scroller, EINA_FALSE);
+  elm_table_pack(place, scroller, 0, 0, 1, 1);
+  state->text = tavro_layout_add(box, "tavro/popup_text");
+  tavro_fill_width(state->text);
+  state->strut = _clear_rectangle_add(box);
+  elm_object_part_content_set(state->text, "tavro.swallow.strut", state->strut);
+  tavro_layout_text_set(state->text, "elm.text", title);
+  tavro_layout_text_set(state->text, "elm.text.body", body);
+  elm_box_pack_end(box, state->text);
+  evas_object_show(place);
+  return place;
 }
 
 Evas_Object *_entries_show(appdata *ad, Evas_Object **slot, const char *group,
@@ -111,15 +177,22 @@ Evas_Object *tavro_popup_show(appdata *ad, Evas_Object **slot, const char *title
     TAVRO_LOGE("popup cannot be shown: %s", title);
     return nullptr;
   }
-  tavro_layout_text_set(popup, "elm.text", title);
-  tavro_layout_text_set(popup, "elm.text.body", body);
   elm_atspi_accessible_name_set(popup, title);
   elm_atspi_accessible_description_set(popup, body);
-  Evas_Object *box = elm_box_add(popup);
-  elm_box_horizontal_set(box, buttons.size() < 3 || _is_landscape(ad->win));
-  elm_box_align_set(box, 1.0, 0.5);
-  _add_buttons(ad, popup, box, "tavro_flat", buttons);
-  elm_object_part_content_set(popup, "tavro.swallow.buttons", box);
+  popup_state *state = static_cast<popup_state *>(evas_object_data_get(popup, kStateKey));
+  Evas_Object *column = elm_box_add(popup);
+  elm_box_padding_set(column, 0, _units(kButtonsGapUnits));
+  elm_box_pack_end(column, _add_texts(state, column, title, body));
+  state->buttons = elm_box_add(column);
+  tavro_fill_width(state->buttons);
+  elm_box_align_set(state->buttons, 1.0, 0.5);
+  _add_buttons(ad, popup, state->buttons, "tavro_flat", buttons);
+  elm_box_pack_end(column, state->buttons);
+  elm_object_content_set(popup, column);
+  evas_object_event_callback_add(popup, EVAS_CALLBACK_RESIZE, _fit_cb, popup);
+  for (Evas_Object *part : {state->text, state->buttons})
+    evas_object_event_callback_add(part, EVAS_CALLBACK_CHANGED_SIZE_HINTS, _fit_cb, popup);
+  _fit_cb(popup, nullptr, nullptr, nullptr);
   return popup;
 }
 

@@ -12,7 +12,6 @@
 #include "tavro_device_status.h"
 #include "tavro_handles.h"
 #include "tavro_log_archive.h"
-#include "tavro_memory.h"
 #include "tavro_review.h"
 #include "tavro_screens.h"
 #include "tavro_widgets.h"
@@ -85,11 +84,6 @@ void _open(const tavro_review_item &item) {
 
 void _schedule_rebuild();
 
-void _drop_dump(problem_view_win *view) {
-  TAVRO_FREE(view->dump_filepath);
-  TAVRO_FREE(view->dump_filename);
-}
-
 void _change(const tavro_review_item &item) {
   compose_view_win *view = tavro_compose_view(_review.ad);
   problem_view_win *problem = _review.ad->problem_view;
@@ -99,7 +93,7 @@ void _change(const tavro_review_item &item) {
   } else if (!problem) {
     return;
   } else if (item.kind == TAVRO_REVIEW_DUMP) {
-    _drop_dump(problem);
+    tavro_compose_dump_remove(_review.ad);
   } else if (item.kind == TAVRO_REVIEW_LOG) {
     tavro_system_log_drop(_review.ad);
   } else if (item.kind == TAVRO_REVIEW_DEVICE_STATUS) {
@@ -128,25 +122,9 @@ void _send_clicked_cb(void *, Evas_Object *, void *) {
 
 // ---- Building ----
 
-const char *_icon_of(tavro_review_kind kind) {
-  switch (kind) {
-    case TAVRO_REVIEW_TEXT:
-      return "chat/accent";
-    case TAVRO_REVIEW_PICTURE:
-      return "image/accent";
-    case TAVRO_REVIEW_VIDEO:
-      return "video/accent";
-    case TAVRO_REVIEW_DUMP:
-      return "bug/accent";
-    case TAVRO_REVIEW_LOG:
-      return "log/accent";
-    case TAVRO_REVIEW_DEVICE_STATUS:
-      return "file/accent";
-    case TAVRO_REVIEW_ACCOUNT:
-      break;
-  }
-  return "person/accent";
-}
+// In the order of tavro_review_kind.
+constexpr const char *kIcons[] = {"chat/accent", "image/accent", "video/accent", "bug/accent",
+                                  "log/accent",  "file/accent",  "person/accent"};
 
 void _build_end(Evas_Object *row, const tavro_review_item &item, const void *place) {
   const bool is_removal = item.action == TAVRO_REVIEW_REMOVE;
@@ -164,8 +142,8 @@ Evas_Object *_build_row(const tavro_review_item &item, const void *place) {
   Evas_Object *row = tavro_layout_add(_review.box, "tavro/review/row");
   tavro_fill_width(row);
   Evas_Object *opener =
-      tavro_button_add(row, "tavro_item", item.title.c_str(), tavro_icon_add(row, _icon_of(item.kind)),
-                       nullptr, item.can_open ? _row_clicked_cb : nullptr, place);
+      tavro_button_add(row, "tavro_item", item.title.c_str(), tavro_icon_add(row, kIcons[item.kind]), nullptr,
+                       item.can_open ? _row_clicked_cb : nullptr, place);
   tavro_layout_text_set(opener, "elm.text.sub", item.detail.c_str());
   elm_atspi_accessible_description_set(opener, item.detail.c_str());
   if (!item.is_sent) elm_object_signal_emit(opener, "tavro,off", "tavro");

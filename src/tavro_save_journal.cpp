@@ -191,27 +191,9 @@ int _complete(GKeyFile *file) {
   return store_is_voc_complete(id) && store_has_attachments(id, attachment_count) ? id : 0;
 }
 
-void _set_damaged_aside(const char *path, const char *reason) {
-  TAVRO_LOGE("save journal is damaged, kept as %s: %s", kDamagedPath, reason);
-  rename(path, kDamagedPath);
-}
-
-// Null when there is no note, when it is damaged, and when it cannot be read now (no memory, a failing disk):
-// then it stays for a later time.
-TavroKeyFile _load(const char *path) {
-  TavroKeyFile file(g_key_file_new());
-  TavroError error;
-  if (g_key_file_load_from_file(file.get(), path, G_KEY_FILE_NONE, tavro_out(error))) return file;
-  if (error->domain == G_KEY_FILE_ERROR)
-    _set_damaged_aside(path, error->message);
-  else if (!g_error_matches(error.get(), G_FILE_ERROR, G_FILE_ERROR_NOENT))
-    TAVRO_LOGE("save journal cannot be read now: %s", error->message);
-  return nullptr;
-}
-
 // The noted report, complete now; 0 when there is none, or it cannot be completed yet.
 int _recover() {
-  const TavroKeyFile file = _load(kPath);
+  const TavroKeyFile file = tavro_note_load(kPath, kDamagedPath);
   if (!file) return 0;
   const TavroGText type(g_key_file_get_string(file.get(), kReport, kType, nullptr));
   int id = 0;
@@ -220,7 +202,7 @@ int _recover() {
   } else if (g_strcmp0(type.get(), TAVRO_DBMGR_SUGGESTION) == 0) {
     id = _complete<tavro_dbmgr_suggestion_info>(file.get());
   } else {
-    _set_damaged_aside(kPath, "unknown type");
+    tavro_note_set_aside(kPath, kDamagedPath, "unknown type");
   }
   if (id < 1) return 0;
   _remove(kPath);
@@ -231,7 +213,7 @@ int _recover() {
 // Take what was stored of an abandoned report out of the store. A full disk may refuse that too: then the
 // note stays, and it is tried again before the next save.
 void _drop_abandoned() {
-  const TavroKeyFile file = _load(kAbandonedPath);
+  const TavroKeyFile file = tavro_note_load(kAbandonedPath, kDamagedPath);
   const int last_id = file ? store_last_voc_id() : -1;
   if (last_id < 0) return;
   _without_remains(0);

@@ -14,7 +14,6 @@
 #include "tavro_compose_keeper.h"
 #include "tavro_compose_strip.h"
 #include "tavro_handles.h"
-#include "tavro_log.h"
 #include "tavro_preferences.h"
 #include "tavro_request.h"
 #include "tavro_screens.h"
@@ -29,6 +28,8 @@ constexpr size_t kLongestTextBytes = 1024 * 1024;
 struct shared_content {
   std::vector<std::string> files;
   std::string text;
+  unsigned int left_out = 0;  // files beyond the limit
+  bool is_text_cut = false;
 };
 shared_content _waiting;  // for an account
 
@@ -46,13 +47,23 @@ void _add_file(const std::string &name) {
   if (_waiting.files.size() < kMostFiles)
     _waiting.files.push_back(_path_of(name));
   else
-    TAVRO_LOGE("too many files are shared at once: %s is left out", name.c_str());
+    _waiting.left_out++;
+}
+
+// Between two characters.
+void _cut(std::string *text) {
+  size_t end = kLongestTextBytes;
+  while (end > 0 && (static_cast<unsigned char>((*text)[end]) & 0xC0) == 0x80) end--;
+  text->resize(end);
 }
 
 void _add_text(const std::string &text) {
-  if (text.empty() || _waiting.text.size() + text.size() > kLongestTextBytes) return;
+  if (text.empty()) return;
   if (!_waiting.text.empty()) _waiting.text += "\n";
   _waiting.text += text;
+  if (_waiting.text.size() <= kLongestTextBytes) return;
+  _cut(&_waiting.text);
+  _waiting.is_text_cut = true;
 }
 
 void _take(app_control_h request) {
@@ -72,11 +83,23 @@ compose_view_win *_compose_screen(appdata *ad) {
   return tavro_compose_view(ad);
 }
 
-void _attach(appdata *ad, const std::vector<std::string> &files) {
+// What did not get as far as the screen, a line each.
+std::string _left_out(const shared_content &content) {
+  std::string lines;
+  if (content.left_out > 0) {
+    const TavroGText files(g_strdup_printf(tavro_text("IDS_OB_BODY_PD_FILES_LEFT_OUT"), content.left_out));
+    lines = files.get();
+  }
+  if (content.is_text_cut)
+    lines += (lines.empty() ? "" : "\n") + std::string(tavro_text("IDS_OB_BODY_TEXT_CUT"));
+  return lines;
+}
+
+void _attach(appdata *ad, const std::vector<std::string> &files, const std::string &left_out) {
   GSList *paths = nullptr;
   for (const std::string &file : files) paths = g_slist_append(paths, const_cast<char *>(file.c_str()));
   const TavroHandle<GSList, g_slist_free> owned(paths);
-  tavro_compose_attach_files(ad, paths);
+  tavro_compose_attach_files(ad, paths, left_out);
 }
 
 void _append_text(const compose_view_win *view, const std::string &text) {
@@ -100,6 +123,6 @@ void tavro_attach_waiting_files(appdata *ad) {
   if (!view) return;
   const shared_content content = std::exchange(_waiting, {});
   _append_text(view, content.text);
-  _attach(ad, content.files);
+  _attach(ad, content.files, _left_out(content));
   tavro_compose_keeper_note();
 }

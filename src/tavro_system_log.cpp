@@ -2,11 +2,11 @@
 
 #include <Ecore.h>
 #include <gio/gio.h>
-#include <sys/stat.h>
 #include <unistd.h>
 
-#include <cerrno>
 #include <cstring>
+#include <ctime>
+#include <deque>
 #include <string>
 
 #include "tavro-main.h"
@@ -15,6 +15,7 @@
 #include "tavro_drafts.h"
 #include "tavro_handles.h"
 #include "tavro_log.h"
+#include "tavro_log_folder.h"
 #include "tavro_memory.h"
 #include "tavro_preferences.h"
 #include "tavro_request.h"
@@ -24,11 +25,17 @@ namespace {
 
 constexpr double kTimeLimitSeconds = 30.0;
 
+struct log_call {
+  double asked_at;  // loop time
+  time_t clock;
+};
+
 struct log_request {
   tavro_system_log_state progress;  // OFF, COLLECTING or FAILED
-  // Answers that are still to come and that nobody wants any more. The service answers in order, so these
-  // come before the one that is waited for.
-  int unwanted_answers;
+  log_call call;                    // the last one
+  // Calls whose answers are still to come and that nobody wants any more. The service answers in order, so
+  // these come before the one that is waited for.
+  std::deque<log_call> unwanted_answers;
   guint watch;  // on the service, while any answer is to come
   Ecore_Timer *time_limit;
 };
@@ -39,21 +46,17 @@ void _notify(appdata *ad) {
   if (_changed) _changed(ad);
 }
 
-bool _is_log_file(const std::string &path) {
-  struct stat info = {};
-  const size_t folder = sizeof TAVRO_LOG_DUMP_FOLDER - 1;
-  return path.compare(0, folder, TAVRO_LOG_DUMP_FOLDER) == 0 && path.size() > folder &&
-         path.find('/', folder) == std::string::npos && lstat(path.c_str(), &info) == 0 &&
-         S_ISREG(info.st_mode);
-}
-
-void _delete_log_file(const std::string &path) {
-  if (!_is_log_file(path)) return;
-  if (unlink(path.c_str()) != 0) TAVRO_LOGE("system log %s: %s", path.c_str(), std::strerror(errno));
+// An answer that has not come within the time limit is lost: it must not be waited for in later ones.
+void _forget_lost_answers() {
+  auto &unwanted = _request.unwanted_answers;
+  while (!unwanted.empty() && ecore_loop_time_get() - unwanted.front().asked_at >= kTimeLimitSeconds)
+    unwanted.pop_front();
 }
 
 void _unwatch_when_answered() {
-  if (!_request.watch || _request.progress == TAVRO_SYSTEM_LOG_COLLECTING || _request.unwanted_answers > 0)
+  _forget_lost_answers();
+  if (!_request.watch || _request.progress == TAVRO_SYSTEM_LOG_COLLECTING ||
+      !_request.unwanted_answers.empty())
     return;
   g_bus_unwatch_name(_request.watch);
   _request.watch = 0;
@@ -70,7 +73,7 @@ void _finish(tavro_system_log_state progress) {
 }
 
 void _stop_waiting(tavro_system_log_state progress) {
-  if (_request.progress == TAVRO_SYSTEM_LOG_COLLECTING) _request.unwanted_answers++;
+  if (_request.progress == TAVRO_SYSTEM_LOG_COLLECTING) _request.unwanted_answers.push_back(_request.call);
   _finish(progress);
 }
 
@@ -85,7 +88,7 @@ Eina_Bool _time_limit_cb(void *data) {
 // The service cannot be started or has died: no answer will come, not even one to an earlier request.
 void _service_vanished_cb(GDBusConnection *, const char *, gpointer data) {
   const bool was_collecting = _request.progress == TAVRO_SYSTEM_LOG_COLLECTING;
-  _request.unwanted_answers = 0;
+  _request.unwanted_answers.clear();
   _finish(was_collecting ? TAVRO_SYSTEM_LOG_FAILED : _request.progress);
   if (!was_collecting) return;
   TAVRO_LOGE("there is no crash service to give the system log");
@@ -118,7 +121,7 @@ void _forget_file(problem_view_win *view) {
 std::string _file_of(app_control_h answer) {
   const TavroText name = tavro_request_text(answer, TAVRO_DUMP_LOG_FILE);
   const std::string path = name ? std::string(TAVRO_LOG_DUMP_FOLDER) + name.get() : "";
-  return _is_log_file(path) ? path : "";
+  return tavro_log_folder_has(path) ? path : "";
 }
 
 // A stored draft's log goes when the new record is stored, not before.
@@ -146,8 +149,11 @@ void tavro_system_log_collect(appdata *ad) {
   if (!ad->problem_view || current == TAVRO_SYSTEM_LOG_READY || current == TAVRO_SYSTEM_LOG_COLLECTING)
     return;
   _forget_file(ad->problem_view);  // of a draft whose log is gone
+  _forget_lost_answers();
+  tavro_log_folder_prune();
   preference_set_boolean(TAVRO_PREF_SYSLOGS, true);
   _request.progress = TAVRO_SYSTEM_LOG_COLLECTING;
+  _request.call = {ecore_loop_time_get(), std::time(nullptr)};
   _request.time_limit = ecore_timer_add(kTimeLimitSeconds, _time_limit_cb, ad);
   _watch_service(ad);
   if (!_call_service()) _finish(TAVRO_SYSTEM_LOG_FAILED);
@@ -158,7 +164,7 @@ void tavro_system_log_drop(appdata *ad) {
   _stop_waiting(TAVRO_SYSTEM_LOG_OFF);
   problem_view_win *view = ad->problem_view;
   if (view && view->syslog_filepath) {
-    if (!_is_of_stored_draft(ad, view->syslog_filepath)) _delete_log_file(view->syslog_filepath);
+    if (!_is_of_stored_draft(ad, view->syslog_filepath)) tavro_log_folder_delete(view->syslog_filepath);
     _forget_file(view);
   }
   _notify(ad);
@@ -170,11 +176,11 @@ void tavro_system_log_end(appdata *) {
 
 void tavro_take_dump_log(app_control_h request, appdata *ad) {
   const std::string path = _file_of(request);
-  if (_request.unwanted_answers > 0) {
-    _request.unwanted_answers--;
-    _unwatch_when_answered();
-    _delete_log_file(path);
-    return;
+  _unwatch_when_answered();
+  if (!_request.unwanted_answers.empty()) {
+    tavro_log_folder_delete_unwanted(path, _request.unwanted_answers.front().clock);
+    _request.unwanted_answers.pop_front();
+    return _unwatch_when_answered();
   }
   if (_request.progress != TAVRO_SYSTEM_LOG_COLLECTING || !ad->problem_view) {
     // Perhaps not the crash service's: what it names stays.

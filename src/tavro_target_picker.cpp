@@ -2,12 +2,12 @@
 // field narrows both.
 #include <elm_atspi.h>
 
-#include <cstdio>
 #include <memory>
 
 #include "tavro-common.h"
 #include "tavro-main.h"
 #include "tavro_app_list.h"
+#include "tavro_handles.h"
 #include "tavro_memory.h"
 #include "tavro_performance_page.h"
 #include "tavro_screens.h"
@@ -75,11 +75,10 @@ std::string _sought(const category_view_win *view) {
 }
 
 void _show_nothing_found(category_view_win *view, const std::string &sought) {
-  char text[256];
-  std::snprintf(text, sizeof text, tavro_text("IDS_OB_BODY_NOTHING_CALLED_PS"), sought.c_str());
+  const TavroGText text(g_strdup_printf(tavro_text("IDS_OB_BODY_NOTHING_CALLED_PS"), sought.c_str()));
   Evas_Object *empty = tavro_layout_add(view->frame, "tavro/empty");
   elm_object_part_content_set(empty, "icon_area", tavro_tile_add(empty, "search"));
-  tavro_layout_text_set(empty, nullptr, text);
+  tavro_layout_text_set(empty, nullptr, text.get());
   elm_object_signal_emit(empty, "tavro,headed", "tavro");
   tavro_layout_text_set(empty, "elm.text.sub", tavro_text("IDS_OB_BODY_NOTHING_CALLED_HINT"));
   elm_object_part_content_set(view->frame, "tavro.swallow.nothing", empty);
@@ -178,6 +177,7 @@ void _build_page(category_view_win *view, const char *title) {
       tavro_page_action_add(page, "search", tavro_text("IDS_OB_BUTTON_SEARCH"), _search_clicked_cb, view);
   view->frame = tavro_layout_add(page, "tavro/picker");
   view->list = tavro_target_list_add(view->frame);
+  elm_atspi_accessible_name_set(view->list, title);
   elm_object_content_set(view->frame, view->list);
   elm_object_content_set(page, view->frame);
   elm_naviframe_item_pop_cb_set(tavro_page_push(view->ad, page, title), _pop_cb, view);

@@ -88,7 +88,6 @@ void CrashJobs::work_thread(GTask *task, gpointer, gpointer data, GCancellable *
   if (work->kind == Kind::kDeleteDump) {
     delete_crash_folders();
   } else {
-    delete_old_archives();
     work->file = write_log_archive(collect_log(work->journal_stop), &work->reason);
   }
   g_task_return_boolean(task, TRUE);

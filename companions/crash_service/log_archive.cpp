@@ -4,14 +4,12 @@
 #include <sys/stat.h>
 #include <zip.h>
 
-#include <algorithm>
 #include <array>
 #include <cerrno>
 #include <cstdio>
 #include <cstring>
 #include <ctime>
 #include <string>
-#include <vector>
 
 #include "crash_log.h"
 #include "tavro_crash_service.h"
@@ -22,8 +20,6 @@ namespace {
 constexpr char kPrefix[] = "SystemLog_";
 constexpr char kEntry[] = "system.log";
 constexpr char kUnfinished[] = ".SystemLog.part";
-constexpr size_t kKeptArchives = 20;
-constexpr time_t kKeptSeconds = 7 * 24 * 60 * 60;
 
 struct ZipCloser {
   void operator()(void *zip) const { zipClose(zip, nullptr); }
@@ -83,17 +79,6 @@ bool sync_folder() {
   return folder && fsync(folder.get()) == 0;
 }
 
-// Newest first: their names are in the order of their times.
-std::vector<std::string> list_archives() {
-  std::vector<std::string> names;
-  const TavroDir folder(opendir(TAVRO_LOG_DUMP_FOLDER));
-  while (const dirent *entry = folder ? readdir(folder.get()) : nullptr) {
-    if (std::strncmp(entry->d_name, kPrefix, sizeof kPrefix - 1) == 0) names.push_back(entry->d_name);
-  }
-  std::sort(names.rbegin(), names.rend());
-  return names;
-}
-
 }  // namespace
 
 std::string write_log_archive(const std::string &log, std::string *reason) {
@@ -112,15 +97,4 @@ std::string write_log_archive(const std::string &log, std::string *reason) {
   unfinished.keep();
   if (!sync_folder()) CRASH_LOGE("%s: %s", TAVRO_LOG_DUMP_FOLDER, std::strerror(errno));
   return name;
-}
-
-void delete_old_archives() {
-  const std::vector<std::string> names = list_archives();
-  for (size_t i = kKeptArchives; i < names.size(); ++i) {
-    const std::string path = TAVRO_LOG_DUMP_FOLDER + names[i];
-    struct stat info;
-    const bool is_old = lstat(path.c_str(), &info) == 0 && S_ISREG(info.st_mode) &&
-                        std::time(nullptr) - info.st_mtime > kKeptSeconds;
-    if (is_old && unlink(path.c_str()) != 0) CRASH_LOGE("%s: %s", path.c_str(), std::strerror(errno));
-  }
 }

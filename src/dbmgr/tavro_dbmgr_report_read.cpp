@@ -245,6 +245,19 @@ int tavro_dbmgr_check_if_dump_file_is_uploaded(const char *dump_name) {
   return sqlite3_errcode(store.db()) == SQLITE_DONE ? 1 : -1;
 }
 
+int tavro_dbmgr_is_syslog_file_stored(const char *path) {
+  if (!path) return -1;
+  const store_session store;
+  if (!store) return -1;
+  statement_text sql;
+  sa_strcat(sql, "SELECT VOC_ID FROM TABLE_VOC_EXTENDED WHERE REF_2 = ", quoted(path),
+            " AND VOC_ID IN (SELECT VOC_ID FROM TABLE_VOC);");
+  const TavroStmt statement = store_prepare(store.db(), sql.c_str());
+  if (!statement) return -1;
+  if (store_next_row(statement.get())) return 1;
+  return sqlite3_errcode(store.db()) == SQLITE_DONE ? 0 : -1;
+}
+
 char *tavro_dbmgr_get_voc_title_description_by_id(int voc_id) {
   return _read_text_of_report("TABLE_VOC_EXTENDED", "VOC_TITLE_TEXT", voc_id);
 }

@@ -13,7 +13,6 @@ from phone_driver import BUILD, Phone, wait_until
 SERVICE = "org.tizen.system.crash"
 PROGRAM = BUILD / "apps" / SERVICE / "bin" / SERVICE
 CALL = ["gdbus", "call", "--session", "-d", SERVICE, "-o", "/Org/Tizen/System/Crash/Crash", "-m"]
-A_FORTNIGHT_AGO = time.time() - 14 * 24 * 60 * 60
 
 
 @pytest.fixture
@@ -130,14 +129,3 @@ def test_an_end_in_the_middle_leaves_no_file_and_starts_no_client(phone):
         wait_until(lambda: phone.execute("kill", "-0", pid, check=False).returncode, what="the end of the service")
     assert list(phone.logs.iterdir()) == []
     assert "corvane.tavro-lite" not in phone.status() and answers(phone) == []
-
-
-def test_old_logs_go_when_there_are_many_and_nothing_else_does(phone):
-    names = [f"SystemLog_202001{day}_000000.zip" for day in range(10, 34)] + ["AppLog_20200110.zip"]
-    for name in names:
-        (phone.logs / name).write_text("zip")
-        if name != names[2]:  # 10 to 13 are beyond the newest 20; this one is young
-            os.utime(phone.logs / name, (A_FORTNIGHT_AGO, A_FORTNIGHT_AGO))
-    ask(phone)
-    kept = {*names, answer(phone)} - {names[0], names[1], names[3]}
-    assert {path.name for path in phone.logs.iterdir()} == kept

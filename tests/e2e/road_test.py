@@ -114,6 +114,7 @@ def test_draft_is_reopened_with_all_it_held_and_sent_once(road):
     assert road.screen.text("Title") == "Names"
     assert road.screen.text("What happened? What did you expect?") == "every control has one"
     road.screen.wait_for("Remove banner.jpg")
+    road.has_seen_what_is_sent = False  # a draft is shown once more
     road.send()
     report = road.arrived("Names")
     assert [file["name"] for file in report["attachments"] if file["kind"] == "attachment"] == ["banner.jpg"]

@@ -12,7 +12,6 @@
 #include "tavro-common.h"
 #include "tavro_appcontrol_util.h"
 #include "tavro_appdata.h"
-#include "tavro_compose_keeper.h"
 #include "tavro_dbmgr.h"
 #include "tavro_memory.h"
 #include "tavro_notifications.h"

@@ -16,6 +16,7 @@
 
 namespace {
 
+using namespace std::chrono_literals;
 using ::testing::ElementsAre;
 using ::testing::IsEmpty;
 
@@ -105,17 +106,24 @@ TEST_F(SystemLog, AnAnswerThatNamesNoFileOfTheLogFolderFailsAndTouchesNothing) {
 }
 
 TEST_F(SystemLog, AnswersForScreensThatHaveEndedAreThrownAwayWithTheirFiles) {
-  const std::string first = make_log("1.zip"), second = make_log("2.zip"), third = make_log("3.zip");
-  tavro_system_log_collect(&ad);
-  tavro_system_log_end(&ad);
+  const std::string older = make_log("0.zip");
+  std::filesystem::last_write_time(older, std::filesystem::file_time_type::clock::now() - 1min);
+  for (int i = 0; i < 3; ++i) {
+    tavro_system_log_collect(&ad);
+    tavro_system_log_end(&ad);
+  }
+  const std::string first = make_log("1.zip"), second = make_log("2.zip"), third = make_log("3.zip"),
+                    of_draft = make_log("5.zip");
+  store_report("a draft", TAVRO_STATUS_DRAFT_SAVED, of_draft.c_str());
   open_screen();
   tavro_system_log_collect(&ad);
   tavro_system_log_drop(&ad);
   EXPECT_EQ(state(), TAVRO_SYSTEM_LOG_OFF);
   tavro_system_log_collect(&ad);
-  answer("1.zip");
-  answer("2.zip");
+  for (const char *name : {"0.zip", "5.zip", "1.zip", "2.zip"}) answer(name);
   EXPECT_EQ(state(), TAVRO_SYSTEM_LOG_COLLECTING);
+  EXPECT_TRUE(std::filesystem::exists(older)) << "it was there before it was asked for";
+  EXPECT_TRUE(std::filesystem::exists(of_draft));
   EXPECT_FALSE(std::filesystem::exists(first));
   EXPECT_FALSE(std::filesystem::exists(second));
   answer("3.zip");
@@ -125,6 +133,32 @@ TEST_F(SystemLog, AnswersForScreensThatHaveEndedAreThrownAwayWithTheirFiles) {
   for (const char *name : {"3.zip", "4.zip"}) answer(name);
   EXPECT_EQ(path(), third);
   EXPECT_TRUE(std::filesystem::exists(third) && std::filesystem::exists(fourth));
+}
+
+TEST_F(SystemLog, ALostAnswerDoesNotTakeThePlaceOfALaterOne) {
+  const double now = ecore_loop_time_get();
+  ecore_loop_time_set(now - 31);
+  tavro_system_log_collect(&ad);
+  tavro_system_log_drop(&ad);
+  ecore_loop_time_set(now);
+  tavro_system_log_collect(&ad);
+  const std::string log = make_log("1.zip");
+  answer("1.zip");
+  EXPECT_EQ(path(), log);
+}
+
+TEST_F(SystemLog, OldLogsGoWhenThereAreManyAndNoStoredReportNeedsThem) {
+  std::vector<std::string> logs;
+  for (int day = 10; day < 35; ++day)
+    logs.push_back(make_log("SystemLog_202001" + std::to_string(day) + "_000000.zip"));
+  logs.push_back(make_log("AppLog_20200110.zip"));
+  for (const std::string &log : logs)
+    std::filesystem::last_write_time(log, std::filesystem::file_time_type::clock::now() - 24h * 14);
+  make_log("SystemLog_20200112_000000.zip");  // young; 10 to 14 are beyond the newest 20
+  store_report("a draft", TAVRO_STATUS_DRAFT_SAVED, logs[3].c_str());
+  tavro_system_log_collect(&ad);
+  for (size_t i = 0; i < logs.size(); ++i)
+    EXPECT_EQ(std::filesystem::exists(logs[i]), i != 0 && i != 1 && i != 4) << logs[i];
 }
 
 TEST_F(SystemLog, GivingItUpDeletesOnlyALogThatNoStoredDraftNeeds) {

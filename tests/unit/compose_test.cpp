@@ -1,6 +1,8 @@
 // The compose screens with real widgets, painted into memory, on a real store and bus.
+#define EFL_BETA_API_SUPPORT  // reading what a screen reader is told
 #include <Elementary.h>
 #include <app_preference.h>
+#include <elm_atspi.h>
 #include <gmock/gmock.h>
 #include <unistd.h>
 
@@ -12,6 +14,7 @@
 #include "tavro-common.h"
 #include "tavro-main.h"
 #include "tavro_appdata.h"
+#include "tavro_autosave.h"
 #include "tavro_compose.h"
 #include "tavro_compose_parts.h"
 #include "tavro_compose_strip.h"
@@ -27,6 +30,8 @@ namespace {
 
 using testing::ElementsAre;
 using testing::HasSubstr;
+
+using Voc = TavroHandle<svc_voc_data, tavro_dbmgr_free_voc_data>;
 
 constexpr char kMedia[] = "/opt/usr/media/compose-test/";
 
@@ -100,24 +105,30 @@ class Compose : public testing::Test {
   static void tap(Evas_Object *button) { evas_object_smart_callback_call(button, "clicked", nullptr); }
   void tap_send() { tap(elm_object_part_content_get(view()->bottom, "tavro.swallow.button")); }
 
+  static Evas_Object *find_button(Evas_Object *below, const char *label) {
+    if (elm_object_widget_check(below) && strstr(elm_object_widget_type_get(below), "Button") &&
+        g_strcmp0(elm_object_text_get(below), label) == 0)
+      return below;
+    const TavroHandle<Eina_List, eina_list_free> members(evas_object_smart_members_get(below));
+    Evas_Object *found = nullptr;
+    for (Eina_List *link = members.get(); link && !found; link = eina_list_next(link))
+      found = find_button(static_cast<Evas_Object *>(eina_list_data_get(link)), label);
+    return found;
+  }
   // Tap a popup's button; false when it has none of this text.
   static bool answer(Evas_Object *popup, const char *text) {
-    Evas_Object *box = elm_object_part_content_get(popup, "tavro.swallow.buttons");
-    Eina_List *buttons = elm_box_children_get(box ? box : elm_object_content_get(popup));
-    const Eina_List *link;
-    void *found = nullptr, *button;
-    EINA_LIST_FOREACH(buttons, link, button)
-    if (std::string(elm_object_text_get(static_cast<Evas_Object *>(button))) == tavro_text(text))
-      found = button;
-    eina_list_free(buttons);
-    if (found) tap(static_cast<Evas_Object *>(found));
+    Evas_Object *found = find_button(popup, tavro_text(text));
+    if (found) tap(found);
     return found;
   }
   static std::string text(const Evas_Object *widget, const char *part) {
     const char *shown = widget ? elm_object_part_text_get(widget, part) : nullptr;
     return shown ? shown : "";
   }
-  static std::string body(const Evas_Object *popup) { return text(popup, "elm.text.body"); }
+  static std::string body(Evas_Object *popup) {
+    const char *told = popup ? efl_access_object_description_get(popup) : nullptr;
+    return told ? told : "";
+  }
   std::string size_text() { return text(view()->bottom, "elm.text"); }
 
   std::vector<std::string> attached() {
@@ -141,13 +152,15 @@ class Compose : public testing::Test {
     return query("SELECT " + column + " FROM TABLE_VOC_EXTENDED ORDER BY VOC_ID DESC LIMIT 1");
   }
 
-  svc_voc_data *store_draft() {
+  svc_voc_data *store_draft(const char *log = nullptr) {
     tavro_dbmgr_bug_report_info report{};
     report.submitted = TAVRO_STATUS_DRAFT_SAVED;
     report.title_description = TAVRO_STRDUP("kept");
+    report.syslog_file = TAVRO_STRDUP(log);
     const int id = tavro_dbmgr_update_bug_report(&report);
     TAVRO_FREE(report.title_description);
     TAVRO_FREE(report.type);
+    TAVRO_FREE(report.syslog_file);
     return tavro_dbmgr_get_voc_by_id(id);
   }
 
@@ -203,20 +216,11 @@ TEST_F(Compose, AttachmentsAreReorderedAndTheMenuOffersOnlyWhatIsPossible) {
   EXPECT_THAT(attached(), ElementsAre("c.jpg", "b.jpg"));
 }
 
-TEST_F(Compose, SillySizeSettingGivesASaneLimitThatIsShown) {
+TEST_F(Compose, SizeIsShownAgainstASaneLimit) {
   tavro_create_problem_page(&ad_, nullptr);
-  struct {
-    int kilobytes;
-    const char *shown;
-  } const cases[] = {{0, "0.0 of 30.0 MB"},
-                     {-5, "0.0 of 30.0 MB"},
-                     {51200, "0.0 of 50.0 MB"},
-                     {INT_MAX, "0.0 of 1024.0 MB"}};
-  for (const auto &expected : cases) {
-    preference_set_int(TAVRO_PREF_MAX_SIZE_ATTACHMENT, expected.kilobytes);
-    tavro_compose_size_refresh(&ad_);
-    EXPECT_EQ(size_text(), expected.shown);
-  }
+  preference_set_int(TAVRO_PREF_MAX_SIZE_ATTACHMENT, INT_MAX);
+  tavro_compose_size_refresh(&ad_);
+  EXPECT_EQ(size_text(), "0.0 of 1024.0 MB");
 }
 
 TEST_F(Compose, FilesLostSinceTheyWereChosenAreNamedBeforeSending) {
@@ -248,6 +252,38 @@ TEST_F(Compose, DeviceStatusGoesAlongUnlessThePersonTookItOff) {
   EXPECT_EQ(newest("REF_3"), "");
 }
 
+// Stored, it does not know whether the person had taken the device status off.
+TEST_F(Compose, DraftOfAProblemIsShownOnceMoreBeforeItGoes) {
+  write_problem();
+  tavro_compose_save_draft(&ad_);
+  const Voc draft(tavro_dbmgr_get_voc_by_id(std::stoi(newest("VOC_ID"))));
+  tavro_create_problem_page(&ad_, draft.get());
+  settle();
+  tap_send();
+  ASSERT_TRUE(view()) << newest("VOC_ID");
+  EXPECT_FALSE(ad_.cancel_popup) << body(ad_.cancel_popup);
+  EXPECT_NE(elm_naviframe_top_item_get(ad_.nf), view()->nf_it);
+  tavro_compose_send_from_review(&ad_);
+  EXPECT_FALSE(view());
+}
+
+TEST_F(Compose, DamagedDraftOpensWithWhatIsThere) {
+  const std::string text = make_file("text.jpg", "no picture", 2097152);
+  const Voc draft(store_draft());
+  for (const char *path : {static_cast<const char *>(nullptr), text.c_str()}) {
+    auto *file = TAVRO_ZALLOC(tavro_dbmgr_attachment_info);
+    file->file_path = TAVRO_STRDUP(path);
+    draft->attachments = g_slist_append(draft->attachments, file);
+  }
+  ad_.type = CRASH;
+  tavro_create_problem_page(&ad_, draft.get());
+  EXPECT_EQ(ad_.type, CRASH);
+  EXPECT_THAT(attached(), ElementsAre("text.jpg"));
+  EXPECT_EQ(size_text(), "2.0 of 30.0 MB");
+  tavro_create_problem_page(&ad_, nullptr);
+  EXPECT_EQ(ad_.type, PROBLEM) << "a new report is of no crash";
+}
+
 TEST_F(Compose, StoreThatRefusesTheReportLeavesTheScreenAsItIs) {
   write_problem();
   const std::string picture = make_picture("kept.jpg");
@@ -261,6 +297,17 @@ TEST_F(Compose, StoreThatRefusesTheReportLeavesTheScreenAsItIs) {
   EXPECT_THAT(body(ad_.cancel_popup), HasSubstr("could not store"));
   tap_send();
   EXPECT_FALSE(view());
+}
+
+TEST_F(Compose, BlanksAreNothingToSendAndAReportTakesNoMoreFilesThanSupportDoes) {
+  write_problem();
+  elm_entry_entry_set(view()->title_entry, "  \xE2\x80\x8B<br/>");
+  EXPECT_FALSE(tavro_compose_has_content(&ad_));
+  for (unsigned i = 0; i < kMostAttachments; i++)
+    EXPECT_TRUE(tavro_compose_attach(view(), make_picture(std::to_string(i) + ".jpg").c_str()));
+  const std::string beyond = make_picture("beyond.jpg");
+  EXPECT_EQ(tavro_attachment_check(view(), beyond.c_str()), TAVRO_ATTACHMENT_TOO_MANY);
+  EXPECT_FALSE(tavro_compose_attach(view(), beyond.c_str()));
 }
 
 TEST_F(Compose, SecondScreenDoesNotThrowAwayWhatTheFirstHolds) {
@@ -287,19 +334,50 @@ TEST_F(Compose, EmptyScreenMakesRoomForAnotherAndItsMenuGoesWithIt) {
   EXPECT_TRUE(ad_.idea_view);
 }
 
-TEST_F(Compose, LeavingAnUnchangedDraftRemovesOnlyItsAutomaticCopy) {
-  svc_voc_data *copy = store_draft(), *draft = store_draft();
-  tavro_create_problem_page(&ad_, draft);
-  ad_.auto_saved_id = copy->id;
+TEST_F(Compose, UnchangedDraftStaysAndItsAutomaticCopyGoesWhenThePageOrTheApplicationEnds) {
+  for (const bool is_end_of_all : {false, true}) {
+    const Voc copy(store_draft()), draft(store_draft());
+    tavro_create_problem_page(&ad_, draft.get());
+    ad_.auto_saved_id = copy->id;
+    const int before = reports();
+    settle();
+    if (is_end_of_all)
+      tavro_autosave_at_end(&ad_);
+    else
+      elm_naviframe_item_pop(ad_.nf);
+    EXPECT_FALSE(ad_.problem_view);
+    EXPECT_EQ(ad_.auto_saved_id, 0);
+    EXPECT_EQ(reports(), before - 1);
+    EXPECT_EQ(query("SELECT count(*) FROM TABLE_VOC WHERE VOC_ID=" + std::to_string(draft->id)), "1");
+  }
+}
+
+TEST_F(Compose, DraftIsNotDiscardedWithoutAQuestionAndItsLogGoesWithIt) {
+  const std::string log = make_file("draft.zip", "log");
+  const Voc draft(store_draft(log.c_str()));
+  tavro_create_problem_page(&ad_, draft.get());
   const int before = reports();
-  settle();
-  elm_naviframe_item_pop(ad_.nf);
-  EXPECT_FALSE(ad_.problem_view);
-  EXPECT_EQ(ad_.auto_saved_id, 0);
+  tavro_compose_discard(&ad_);
+  ASSERT_TRUE(view());
+  EXPECT_EQ(reports(), before);
+  ASSERT_TRUE(answer(ad_.cancel_popup, "IDS_OB_BUTTON_DISCARD"));
+  EXPECT_FALSE(view());
   EXPECT_EQ(reports(), before - 1);
-  EXPECT_EQ(query("SELECT count(*) FROM TABLE_VOC WHERE VOC_ID=" + std::to_string(draft->id)), "1");
-  tavro_dbmgr_free_voc_data(copy);
-  tavro_dbmgr_free_voc_data(draft);
+  EXPECT_FALSE(std::filesystem::exists(log));
+}
+
+TEST_F(Compose, DraftThatIsStoredAnewKeepsItsLogAndLosesOneThatWasReplaced) {
+  for (const bool is_replaced : {false, true}) {
+    const std::string log = make_file("draft.zip", "log"), other = make_file("other.zip", "log");
+    tavro_create_problem_page(&ad_, Voc(store_draft(log.c_str())).get());
+    if (is_replaced) {
+      TAVRO_FREE(ad_.problem_view->syslog_filepath);
+      ad_.problem_view->syslog_filepath = TAVRO_STRDUP(other.c_str());
+    }
+    tavro_compose_save_draft(&ad_);
+    EXPECT_EQ(std::filesystem::exists(log), !is_replaced);
+    EXPECT_EQ(newest("REF_2"), is_replaced ? other : log);
+  }
 }
 
 // ---- The system log ----
@@ -370,14 +448,43 @@ TEST_F(ComposeLog, TargetThatNeedsALogGetsItAndAnotherGivesItUp) {
 TEST_F(ComposeLog, SettingSwitchesTheLogOnButDoesNotMakeAnEmptyScreenWorthKeeping) {
   start_service();
   preference_set_boolean(TAVRO_PREF_ATTACH_LOGS, true);
-  tavro_create_problem_page(&ad_, nullptr);
+  const int before = reports();
+  for (const bool is_end_of_all : {false, true}) {
+    tavro_create_problem_page(&ad_, nullptr);
+    settle();
+    const std::string path = service_answers("default.zip");
+    ASSERT_TRUE(ad_.problem_view->syslog_filepath);
+    EXPECT_TRUE(elm_check_state_get(view()->log_row));
+    if (is_end_of_all)
+      tavro_autosave_at_end(&ad_);
+    else
+      elm_naviframe_item_pop(ad_.nf);
+    EXPECT_FALSE(view());
+    EXPECT_EQ(reports(), before);
+    EXPECT_FALSE(std::filesystem::exists(path)) << "nobody would ever delete it";
+  }
+}
+
+TEST_F(ComposeLog, SendingWithoutTheLogIsForgottenWhenThePersonGoesBackAndSwitchesItOn) {
+  start_service();
+  preference_set_boolean(TAVRO_PREF_SENT_PAGE_SEEN, false);
+  write_problem();
+  turn_switch(true);
+  tap_send();
+  ASSERT_TRUE(answer(ad_.cancel_popup, "IDS_OB_BUTTON_SEND_WITHOUT_LOG"));
   settle();
-  const std::string path = service_answers("default.zip");
-  ASSERT_TRUE(ad_.problem_view->syslog_filepath);
-  EXPECT_TRUE(elm_check_state_get(view()->log_row));
+  ASSERT_NE(elm_naviframe_top_item_get(ad_.nf), view()->nf_it);
   elm_naviframe_item_pop(ad_.nf);
+  settle();
+  turn_switch(true);
+  tavro_compose_review(&ad_);
+  settle();
+  tavro_compose_send_from_review(&ad_);
+  ASSERT_TRUE(view()) << "it waits for the log";
+  service_answers("given-up.zip");
+  const std::string path = service_answers("wanted.zip");
   EXPECT_FALSE(view());
-  EXPECT_FALSE(std::filesystem::exists(path)) << "nobody would ever delete it";
+  EXPECT_EQ(newest("REF_2"), path);
 }
 
 TEST_F(ComposeLog, ReportWaitsForItsLogAndThenGoesByItself) {

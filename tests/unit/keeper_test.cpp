@@ -4,6 +4,7 @@
 #include <Elementary.h>
 #include <elm_atspi.h>
 #include <gmock/gmock.h>
+#include <sys/resource.h>
 #include <sys/stat.h>
 
 #include <filesystem>
@@ -21,6 +22,7 @@
 #include "tavro_handles.h"
 #include "tavro_lifecycle.h"
 #include "tavro_memory.h"
+#include "tavro_note_file.h"
 #include "tavro_preferences.h"
 #include "tavro_screens.h"
 #include "tavro_share.h"
@@ -165,11 +167,11 @@ class Keeper : public testing::Test {
 TEST_F(Keeper, GivesBackAllThatAScreenHeldWhateverItsKind) {
   const std::string text = "It's \"loud\"\n\\n <b>&amp; \U0001F600 \u05E9\u05DC\u05D5\u05DD\n";
   for (const reportType type : {PROBLEM, CRASH, IDEA}) {
-    ad_.type = type;
     if (type == IDEA)
       tavro_create_idea_page(&ad_, nullptr);
     else
       tavro_create_problem_page(&ad_, nullptr);
+    ad_.type = type;
     compose_view_win *view = tavro_compose_view(&ad_);
     const TavroHandle<char, free> markup(elm_entry_utf8_to_markup(text.c_str()));
     const std::string title = "title=[" + std::to_string(type) + "]";
@@ -212,10 +214,12 @@ TEST_F(Keeper, IsReadableByTheOwnerAloneAndHoldsNothingWhileNothingIsUnsaved) {
   write_problem("private");
   tavro_compose_keeper_note();
   EXPECT_THAT(kept_files(), IsEmpty()) << "written at once";
+  fs::create_symlink("/opt/usr/media/elsewhere", TAVRO_COMPOSE_KEEPER_FILE ".new");
   app_pause(&ad_);
   struct stat info = {};
-  ASSERT_EQ(stat(TAVRO_COMPOSE_KEEPER_FILE, &info), 0);
-  EXPECT_EQ(info.st_mode & 0777, 0600u);
+  ASSERT_EQ(lstat(TAVRO_COMPOSE_KEEPER_FILE, &info), 0);
+  EXPECT_EQ(info.st_mode, S_IFREG | 0600u);
+  EXPECT_FALSE(fs::exists("/opt/usr/media/elsewhere"));
   for (const char *title : {"", "again"}) {
     write(title, "");
     tavro_compose_keeper_note();
@@ -235,13 +239,13 @@ TEST_F(Keeper, WhatWasNotDecidedStaysBesideWhatIsWrittenNext) {
   evas_object_del(ad_.cancel_popup);  // back
   tavro_compose_keeper_offer(&ad_);
   EXPECT_FALSE(ad_.cancel_popup) << "asked twice";
-  write_problem("second");
+  write_problem("", "<br/> second");
   die_and_start();
   EXPECT_THAT(question(), HasSubstr("first"));
   answer(kKeep);
-  EXPECT_THAT(question(), HasSubstr("second"));
+  EXPECT_THAT(question(), HasSubstr("\n\nsecond"));
   answer(kKeep);
-  EXPECT_THAT(reports(), testing::UnorderedElementsAre("6 first||0", "6 second||0"));
+  EXPECT_THAT(reports(), testing::UnorderedElementsAre("6 first||0", "6 |\n second|0"));
 }
 
 TEST_F(Keeper, IsOfferedToThePersonWhoWroteItOnly) {
@@ -356,9 +360,10 @@ TEST_F(Keeper, SetsADamagedFileAsideAndReadsOneOfALaterVersion) {
       {std::string(5000, '\0'), false},
       {"[writing]\nkind=poem\ntitle=\"x\"\nuser_name=\"anna\"\n", false},
       {"[writing]\nkind=problem\ntitle=\"\\377\"\nuser_name=\"anna\"\n", false},
-      {whole + "attachments=2000000000\nopened_from=junk\nbegun=99999999999999999999\n", true},
+      {"[writing]\nkind=problem\nuser_name=\"anna\"\nattachments=1\n[attachment 0]\ntype=\"x\"\n", false},
+      {whole + "attachments=2000000000\nopened_from=junk\nbegun=99999999999999999999\n[attachment 0]\n",
+       true},
       {whole + "mood=\"new\"\n[colours]\nsky=blue\n", true},
-      {"[writing]\nkind=problem\ntitle=later\"\nuser_name=\"anna\"\n[attachment 0]\n", true},
   };
   for (const auto &given : cases) {
     std::ofstream(TAVRO_COMPOSE_KEEPER_FILE) << given.content;
@@ -373,10 +378,23 @@ TEST_F(Keeper, SetsADamagedFileAsideAndReadsOneOfALaterVersion) {
     }
     fs::remove(TAVRO_COMPOSE_KEEPER_FILE);
   }
+  std::ofstream(TAVRO_COMPOSE_KEEPER_FILE ".damaged") << "an earlier one";
   fs::create_directory(TAVRO_COMPOSE_KEEPER_FILE);
   end();
   start();
-  EXPECT_THAT(kept_files(), ElementsAre(".tavro.compose.damaged"));
+  EXPECT_THAT(kept_files(), ElementsAre(".tavro.compose.damaged", ".tavro.compose.damaged.2"));
+}
+
+TEST_F(Keeper, LeavesAFileThatCannotBeReadJustNowWhereItIs) {
+  std::ofstream(TAVRO_COMPOSE_KEEPER_FILE) << "[writing]\n";
+  rlimit usual = {};
+  getrlimit(RLIMIT_NOFILE, &usual);
+  const rlimit none = {0, usual.rlim_max};
+  setrlimit(RLIMIT_NOFILE, &none);
+  EXPECT_FALSE(tavro_note_load(TAVRO_COMPOSE_KEEPER_FILE, TAVRO_COMPOSE_KEEPER_FILE ".damaged"));
+  setrlimit(RLIMIT_NOFILE, &usual);
+  EXPECT_THAT(kept_files(), ElementsAre(".tavro.compose"));
+  EXPECT_TRUE(tavro_note_load(TAVRO_COMPOSE_KEEPER_FILE, TAVRO_COMPOSE_KEEPER_FILE ".damaged"));
 }
 
 // ---- Sharing ----
@@ -435,6 +453,32 @@ TEST_F(Share, NamesWhatCannotBeAttachedInOnePopupAndTakesTheRest) {
   EXPECT_THAT(attached(), ElementsAre(kPicture));
   for (const std::string &name : bad) EXPECT_THAT(question(), HasSubstr(name + ":"));
   fs::current_path("/");
+}
+
+TEST_F(Share, UnderTheQuestionTakesItsPlaceAndLeavesWhatIsKeptForLater) {
+  write_problem("kept");
+  die_and_start();
+  share({kPicture});
+  settle();
+  EXPECT_EQ(question(), "");
+  write("shared", "");
+  ASSERT_GE(tavro_save_compose_draft(&ad_), 1);
+  settle();
+  tavro_compose_keeper_offer(&ad_);
+  EXPECT_THAT(question(), HasSubstr("kept"));
+  answer(kKeep);
+  EXPECT_THAT(reports(), testing::UnorderedElementsAre("6 shared||1", "6 kept||0"));
+}
+
+TEST_F(Share, NamesFilesAndTextBeyondTheLimits) {
+  std::string lines;
+  while (lines.size() < 1024 * 1024 - 60) lines += std::string(59, 'a') + "\n";
+  lines += std::string(1024 * 1024 - 1 - lines.size(), 'b') + "\u00e4";
+  share(std::vector<const char *>(102, kPicture), nullptr, lines.c_str());
+  EXPECT_EQ(question(), "IDS_OB_BODY_PD_FILES_LEFT_OUT\nIDS_OB_BODY_TEXT_CUT");
+  const TavroHandle<char, free> text(elm_entry_markup_to_utf8(elm_entry_entry_get(ad_.problem_view->entry)));
+  lines.resize(1024 * 1024 - 1);
+  EXPECT_TRUE(lines == text.get());
 }
 
 TEST_F(Share, WithoutAnythingOpensNothing) {

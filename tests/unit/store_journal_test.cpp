@@ -171,12 +171,15 @@ TEST_F(SaveJournal, ReportIsRecoveredIntoANewStoreAfterTheOldOneWasDamaged) {
   EXPECT_EQ(rows(), "1/3/1");
 }
 
-TEST_F(SaveJournal, DamagedNoteIsKeptAsideAndHarmsNothing) {
+TEST_F(SaveJournal, DamagedNotesAreAllKeptAsideAndHarmNothing) {
+  std::string aside = std::string(kJournal) + ".damaged";
+  int place = 1;
   for (const char *contents :
        {"", "garbage", "[report]\ntype=\"other\"\n", "[report]\ntype=x\nattachments=9999999\n"}) {
     std::ofstream(kJournal) << contents;
     EXPECT_EQ(tavro_journal_recover(), 0);
-    EXPECT_EQ(file_contents(std::string(kJournal) + ".damaged"), contents);
+    EXPECT_EQ(file_contents(aside), contents);
+    aside = std::string(kJournal) + ".damaged." + std::to_string(++place);
     EXPECT_EQ(access(kJournal, F_OK), -1);
   }
   EXPECT_EQ(rows(), "0/0/0");

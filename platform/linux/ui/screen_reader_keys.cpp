@@ -61,10 +61,11 @@ void deliver(HeldKey *key) {
   }
 }
 
-// A screen reader may answer for a press alone; the application gets no release without its press.
+// A screen reader may answer otherwise for a release than for its press; the application gets both or
+// neither.
 bool is_for_application(const HeldKey &key) {
   std::set<unsigned int> &consumed = sharing().consumed_presses;
-  if (!key.is_down) return consumed.erase(key.event.keycode) == 0 && key.answer == Answer::kFree;
+  if (!key.is_down) return consumed.erase(key.event.keycode) == 0;
   if (key.answer == Answer::kFree) return consumed.erase(key.event.keycode), true;
   consumed.insert(key.event.keycode);
   return false;
