@@ -186,9 +186,9 @@ Evas_Object *tavro_popup_show(appdata *ad, Evas_Object **slot, const char *title
   state->buttons = elm_box_add(column);
   tavro_fill_width(state->buttons);
   elm_box_align_set(state->buttons, 1.0, 0.5);
-  _add_buttons(ad, popup, state->buttons, "tavro_flat", buttons);
   elm_box_pack_end(column, state->buttons);
   elm_object_content_set(popup, column);
+  _add_buttons(ad, popup, state->buttons, "tavro_flat", buttons);
   evas_object_event_callback_add(popup, EVAS_CALLBACK_RESIZE, _fit_cb, popup);
   for (Evas_Object *part : {state->text, state->buttons})
     evas_object_event_callback_add(part, EVAS_CALLBACK_CHANGED_SIZE_HINTS, _fit_cb, popup);
