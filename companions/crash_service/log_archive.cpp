@@ -10,6 +10,7 @@
 #include <cstring>
 #include <ctime>
 #include <string>
+#include <type_traits>
 
 #include "crash_log.h"
 #include "tavro_crash_service.h"
@@ -35,13 +36,17 @@ struct tm local_time() {
 
 bool add_log(zipFile zip, const std::string &log) {
   const struct tm now = local_time();
+  // Unsigned in some versions of minizip, signed in others.
+  const auto put = [](auto &field, int value) {
+    field = static_cast<std::remove_reference_t<decltype(field)>>(value);
+  };
   zip_fileinfo info = {};
-  info.tmz_date.tm_year = now.tm_year + 1900;
-  info.tmz_date.tm_mon = now.tm_mon;
-  info.tmz_date.tm_mday = now.tm_mday;
-  info.tmz_date.tm_hour = now.tm_hour;
-  info.tmz_date.tm_min = now.tm_min;
-  info.tmz_date.tm_sec = now.tm_sec;
+  put(info.tmz_date.tm_year, now.tm_year + 1900);
+  put(info.tmz_date.tm_mon, now.tm_mon);
+  put(info.tmz_date.tm_mday, now.tm_mday);
+  put(info.tmz_date.tm_hour, now.tm_hour);
+  put(info.tmz_date.tm_min, now.tm_min);
+  put(info.tmz_date.tm_sec, now.tm_sec);
   return zipOpenNewFileInZip(zip, kEntry, &info, nullptr, 0, nullptr, 0, nullptr, Z_DEFLATED,
                              Z_DEFAULT_COMPRESSION) == ZIP_OK &&
          zipWriteInFileInZip(zip, log.data(), static_cast<unsigned>(log.size())) == ZIP_OK &&
