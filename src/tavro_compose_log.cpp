@@ -89,6 +89,13 @@ Eina_Bool _first_update_cb(void *data) {
   return ECORE_CALLBACK_CANCEL;
 }
 
+// Also where the window ends with the screen in it. A newer screen's timer is left alone.
+void _row_deleted_cb(void *timer, Evas *, Evas_Object *, void *) {
+  if (timer != _first_update || !_first_update) return;
+  ecore_timer_del(_first_update);
+  _first_update = nullptr;
+}
+
 }  // namespace
 
 void tavro_compose_log_build(appdata *ad, problem_view_win *view, Evas_Object *box) {
@@ -105,7 +112,9 @@ void tavro_compose_log_build(appdata *ad, problem_view_win *view, Evas_Object *b
   elm_box_pack_end(box, row);
   _show(ad);
   tavro_system_log_watch(_changed_cb);
+  if (_first_update) ecore_timer_del(_first_update);  // of a screen whose window is still on its way out
   _first_update = ecore_timer_add(kFirstUpdateSeconds, _first_update_cb, ad);
+  evas_object_event_callback_add(row, EVAS_CALLBACK_DEL, _row_deleted_cb, _first_update);
 }
 
 void tavro_compose_log_update(appdata *ad) {
