@@ -11,6 +11,7 @@
 
 #include "tavro-common.h"
 #include "tavro-main.h"
+#include "tavro_compose.h"
 #include "tavro_compose_kept.h"
 #include "tavro_drafts.h"
 #include "tavro_log.h"
@@ -36,9 +37,7 @@ struct kept_screen {
 } _screen;
 
 const compose_view_win *_open_view() {
-  const appdata *ad = _screen.ad;
-  if (!ad) return nullptr;
-  return ad->idea_view ? static_cast<const compose_view_win *>(ad->idea_view) : ad->problem_view;
+  return _screen.ad ? tavro_compose_view(_screen.ad) : nullptr;
 }
 
 char *_plain(const Evas_Object *entry) {

@@ -83,20 +83,10 @@ bool _reopen(appdata *ad) {
   return true;
 }
 
-void _name_lost_files(appdata *ad) {
-  std::string names;
-  for (const std::string &path : tavro_compose_lost_attachments(tavro_compose_view(ad)))
-    names += "\n\u2022 " + tavro_file_name(path.c_str());
-  if (names.empty()) return;
-  tavro_popup_show(ad, &ad->cancel_popup, tavro_text("IDS_OB_HEADER_FILES_LOST"),
-                   (tavro_text("IDS_OB_BODY_FILES_LOST") + names).c_str(),
-                   {{tavro_text("IDS_OB_BUTTON_OK"), nullptr}});
-}
-
 void _go_on(appdata *ad) {
   if (!_reopen(ad)) return;
   tavro_compose_forget_opened();
-  _name_lost_files(ad);
+  tavro_compose_tell_lost_files(ad, {{tavro_text("IDS_OB_BUTTON_OK"), nullptr}});
 }
 
 // When the store refuses the draft, its screen is there and says so.

@@ -4,8 +4,11 @@
 
 #include <Elementary.h>
 
+#include <initializer_list>
+
 struct appdata;
 struct problem_view_win;
+struct tavro_popup_button;
 
 // ---- How a screen ends (tavro_compose_end.cpp) ----
 
@@ -37,6 +40,9 @@ void tavro_compose_send_from_review(appdata *ad);
 void tavro_compose_send_log_changed(appdata *ad);
 // The screen ends: nothing waits any more.
 void tavro_compose_send_end();
+
+// Name the attachments that cannot be sent any more in a popup with these buttons; false when there are none.
+bool tavro_compose_tell_lost_files(appdata *ad, std::initializer_list<tavro_popup_button> buttons);
 
 // ---- The system log (tavro_compose_log.cpp) ----
 

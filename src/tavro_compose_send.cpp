@@ -7,6 +7,7 @@
 #include "tavro-common.h"
 #include "tavro-main.h"
 #include "tavro_compose.h"
+#include "tavro_compose_keeper.h"
 #include "tavro_compose_parts.h"
 #include "tavro_compose_strip.h"
 #include "tavro_log.h"
@@ -122,15 +123,9 @@ void _send_without_lost(appdata *ad) {
 }
 
 bool _has_all_files(appdata *ad) {
-  std::string names;
-  for (const std::string &path : tavro_compose_lost_attachments(tavro_compose_view(ad)))
-    names += "\n\u2022 " + tavro_file_name(path.c_str());
-  if (names.empty()) return true;
-  tavro_popup_show(ad, &ad->cancel_popup, tavro_text("IDS_OB_HEADER_FILES_LOST"),
-                   (tavro_text("IDS_OB_BODY_FILES_LOST") + names).c_str(),
-                   {{tavro_text("IDS_OB_BUTTON_SEND_WITHOUT_FILES"), _send_without_lost},
-                    {tavro_text("IDS_OB_BUTTON_STAY"), nullptr}});
-  return false;
+  return !tavro_compose_tell_lost_files(ad,
+                                        {{tavro_text("IDS_OB_BUTTON_SEND_WITHOUT_FILES"), _send_without_lost},
+                                         {tavro_text("IDS_OB_BUTTON_STAY"), nullptr}});
 }
 
 void _begin(appdata *ad) {
@@ -148,7 +143,19 @@ void tavro_compose_send(appdata *ad) {
   const compose_view_win *view = tavro_compose_view(ad);
   if (!view || view->nf_it != elm_naviframe_top_item_get(ad->nf)) return;
   _goes_without_log = false;
+  // What follows may wait for a log or an answer.
+  tavro_compose_keeper_flush();
   _begin(ad);
+}
+
+bool tavro_compose_tell_lost_files(appdata *ad, std::initializer_list<tavro_popup_button> buttons) {
+  std::string names;
+  for (const std::string &path : tavro_compose_lost_attachments(tavro_compose_view(ad)))
+    names += "\n\u2022 " + tavro_file_name(path.c_str());
+  if (names.empty()) return false;
+  tavro_popup_show(ad, &ad->cancel_popup, tavro_text("IDS_OB_HEADER_FILES_LOST"),
+                   (tavro_text("IDS_OB_BODY_FILES_LOST") + names).c_str(), buttons);
+  return true;
 }
 
 void tavro_compose_review(appdata *ad) {
