@@ -199,6 +199,27 @@ void tavro_dbmgr_update_dump_file_bug_report(const char *old_name, const char *n
 
 // The user's reports changed last, newest first, at most 100. Null for none and on failure.
 GSList *tavro_dbmgr_get_vocs_for_history(const char *user_name);
+
+// Which reports a search wants. A text is found in title, description and replies, whatever its case; null or
+// empty finds all.
+enum tavro_voc_stage {
+  TAVRO_VOC_STAGE_ANY,
+  TAVRO_VOC_STAGE_DRAFT,    // 6
+  TAVRO_VOC_STAGE_SENDING,  // 10 and what is shown as sending
+  TAVRO_VOC_STAGE_FAILED,   // 0, 11
+  TAVRO_VOC_STAGE_OPEN,     // 1, 2
+  TAVRO_VOC_STAGE_CLOSED,   // 3, 4, 5
+};
+enum tavro_voc_kind { TAVRO_VOC_KIND_ANY, TAVRO_VOC_KIND_PROBLEM, TAVRO_VOC_KIND_IDEA, TAVRO_VOC_KIND_CRASH };
+struct tavro_voc_filter {
+  const char *text;  // plain UTF-8
+  tavro_voc_stage stage;
+  tavro_voc_kind kind;
+  bool is_unread;  // only those with a reply that was not seen yet
+};
+// The user's reports that match, out of all that are stored, newest change first, at most 100; else as above.
+GSList *tavro_dbmgr_search_vocs(const char *user_name, const tavro_voc_filter &filter);
+
 svc_voc_data *tavro_dbmgr_get_voc_by_id(int voc_id);
 svc_voc_data *tavro_dbmgr_get_voc_by_server_id(int server_id);
 GSList *tavro_dbmgr_get_attachments(int voc_id, sqlite3 *db);

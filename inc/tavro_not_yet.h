@@ -23,9 +23,6 @@ void tavro_load_url(appdata *ad, int in_background);
 void tavro_create_account_page_ui(appdata *ad, GSList *accounts);
 int tavro_add_account_result(appdata *ad);
 
-// Crash reports.
-void tavro_show_crash_report(appdata *ad);
-
 // Beta centre, banners and log-out.
 Evas_Object *tavro_beta_details_optin_button(appdata *ad);  // null when the details page is not shown
 void tavro_refresh_beta_pages(appdata *ad, const char *what);

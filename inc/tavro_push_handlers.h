@@ -1,5 +1,5 @@
 // Handlers of the launch dispatch for news that is not the fate of an upload: replies to reports, beta
-// programmes, banners, log-out, crashes, shared files and touched notifications. Each reads the service's
+// programmes, banners, log-out, shared files and touched notifications. Each reads the service's
 // answer from the preferences or the request and brings the screen concerned in step. Main loop only.
 #pragma once
 
@@ -22,7 +22,6 @@ void tavro_handle_user_logout(app_control_h service, appdata *ad);
 void tavro_handle_non_voc_push_noti(app_control_h service, appdata *ad);
 void tavro_handle_beta_push_noti(app_control_h service, appdata *ad);
 
-void tavro_handle_crash_event(app_control_h service, appdata *ad);
 void tavro_handle_log_dump_event(app_control_h service, appdata *ad);
 void tavro_handle_share_event(app_control_h service, appdata *ad);
 

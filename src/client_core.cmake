@@ -21,6 +21,7 @@ set(TAVRO_CLIENT_CORE
   tavro_preferences.cpp
   tavro_push_handlers.cpp
   tavro_recovery.cpp
+  tavro_report_delete.cpp
   tavro_report_files.cpp
   tavro_request.cpp
   tavro_resend.cpp

@@ -35,4 +35,5 @@ set(TAVRO_CLIENT_UI
   tavro_account_page.cpp
   tavro_history.cpp
   tavro_history_details.cpp
+  tavro_crash_report.cpp
   tavro_share.cpp)

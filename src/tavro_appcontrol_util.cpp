@@ -5,6 +5,7 @@
 
 #include "tavro-main.h"
 #include "tavro_appdata.h"
+#include "tavro_crash_report.h"
 #include "tavro_log.h"
 #include "tavro_memory.h"
 #include "tavro_not_yet.h"

@@ -38,10 +38,6 @@ int tavro_add_account_result(appdata *) {
   return 0;
 }
 
-void tavro_show_crash_report(appdata *) {
-  TAVRO_NOT_YET("crash reports");
-}
-
 Evas_Object *tavro_beta_details_optin_button(appdata *) {
   TAVRO_NOT_YET("the beta details page");
   return nullptr;

@@ -116,13 +116,6 @@ void tavro_handle_beta_push_noti(app_control_h service, appdata *ad) {
   tavro_refresh_beta_pages(ad, "beta notifications");
 }
 
-void tavro_handle_crash_event(app_control_h service, appdata *ad) {
-  _log_request(service);
-  tavro_show_crash_report(ad);
-  // Nothing is shown for the crash, so a client that was started for it alone does not stay.
-  if (!ad->win && !ad->crash_popup) tavro_request_exit(ad);
-}
-
 void tavro_handle_log_dump_event(app_control_h service, appdata *ad) {
   _log_request(service);
   tavro_take_dump_log(service, ad);
