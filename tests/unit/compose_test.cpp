@@ -1,171 +1,17 @@
-// The compose screens with real widgets, painted into memory, on a real store and bus.
-#define EFL_BETA_API_SUPPORT  // reading what a screen reader is told
-#include <Elementary.h>
-#include <app_preference.h>
-#include <elm_atspi.h>
+// The compose screens: what is attached, stored, kept and asked.
 #include <gmock/gmock.h>
-#include <unistd.h>
 
 #include <climits>
 
-#include <filesystem>
-#include <fstream>
-
-#include "tavro-common.h"
-#include "tavro-main.h"
-#include "tavro_appdata.h"
+#include "compose_world.h"
 #include "tavro_autosave.h"
-#include "tavro_compose.h"
 #include "tavro_compose_parts.h"
 #include "tavro_compose_strip.h"
-#include "tavro_crash_service.h"
-#include "tavro_dbmgr.h"
-#include "tavro_handles.h"
-#include "tavro_memory.h"
-#include "tavro_preferences.h"
-#include "tavro_screens.h"
-#include "tavro_system_log.h"
 
 namespace {
 
 using testing::ElementsAre;
 using testing::HasSubstr;
-
-using Voc = TavroHandle<svc_voc_data, tavro_dbmgr_free_voc_data>;
-
-constexpr char kMedia[] = "/opt/usr/media/compose-test/";
-
-std::string make_file(const std::string &name, std::string content, off_t size = 0) {
-  const std::string path = kMedia + name;
-  std::filesystem::create_directories(kMedia);
-  std::ofstream(path) << content;
-  if (size > 0) std::filesystem::resize_file(path, static_cast<uintmax_t>(size));
-  return path;
-}
-
-std::string make_picture(const std::string &name, off_t size = 1000) {
-  return make_file(name, "\xFF\xD8\xFF\xE0 JFIF", size);
-}
-
-// Once for all suites: the toolkit forgets the client's look when it is shut down.
-class Toolkit : public testing::Environment {
-  void SetUp() override {
-    setenv("ELM_ENGINE", "buffer", 1);
-    char name[] = "compose_test", *arguments[] = {name, nullptr};
-    elm_init(1, arguments);
-    tavro_bind_locale();
-    tavro_dbmgr_init_semaphore();
-    tavro_dbmgr_ensure_schema();
-  }
-  void TearDown() override { elm_shutdown(); }
-};
-const testing::Environment *const toolkit = testing::AddGlobalTestEnvironment(new Toolkit);
-
-class Compose : public testing::Test {
- protected:
-  void SetUp() override {
-    tavro_initialize_application_data(&ad_);
-    ASSERT_TRUE(tavro_create_base_window(&ad_));
-    tavro_create_landing_page(&ad_);
-    preference_set_boolean(TAVRO_PREF_SENT_PAGE_SEEN, true);
-    preference_set_boolean(TAVRO_PREF_ATTACH_LOGS, false);
-    preference_remove(TAVRO_PREF_MAX_SIZE_ATTACHMENT);
-  }
-  void TearDown() override {
-    evas_object_del(ad_.win);
-    ecore_main_loop_iterate();
-    tavro_dealloc_memory(&ad_);
-  }
-
-  template <typename Condition>
-  static bool wait_for(Condition condition, double seconds = 5.0) {
-    const double end = ecore_time_get() + seconds;
-    while (!condition() && ecore_time_get() < end) {
-      ecore_main_loop_iterate();
-      g_main_context_iteration(nullptr, FALSE);
-      usleep(2000);
-    }
-    return condition();
-  }
-  // Until the page that was pushed last has come to rest and what was put off is done.
-  static void settle() {
-    wait_for([] { return false; }, 0.6);
-  }
-
-  compose_view_win *view() { return tavro_compose_view(&ad_); }
-
-  // A problem that could be sent.
-  void write_problem(const char *target = "Hardware Store") {
-    tavro_create_problem_page(&ad_, nullptr);
-    view()->app_name = TAVRO_STRDUP(target);
-    elm_entry_entry_set(view()->title_entry, "It broke");
-    settle();
-  }
-
-  static void tap(Evas_Object *button) { evas_object_smart_callback_call(button, "clicked", nullptr); }
-  void tap_send() { tap(elm_object_part_content_get(view()->bottom, "tavro.swallow.button")); }
-
-  static Evas_Object *find_button(Evas_Object *below, const char *label) {
-    if (elm_object_widget_check(below) && strstr(elm_object_widget_type_get(below), "Button") &&
-        g_strcmp0(elm_object_text_get(below), label) == 0)
-      return below;
-    const TavroHandle<Eina_List, eina_list_free> members(evas_object_smart_members_get(below));
-    Evas_Object *found = nullptr;
-    for (Eina_List *link = members.get(); link && !found; link = eina_list_next(link))
-      found = find_button(static_cast<Evas_Object *>(eina_list_data_get(link)), label);
-    return found;
-  }
-  // Tap a popup's button; false when it has none of this text.
-  static bool answer(Evas_Object *popup, const char *text) {
-    Evas_Object *found = find_button(popup, tavro_text(text));
-    if (found) tap(found);
-    return found;
-  }
-  static std::string text(const Evas_Object *widget, const char *part) {
-    const char *shown = widget ? elm_object_part_text_get(widget, part) : nullptr;
-    return shown ? shown : "";
-  }
-  static std::string body(Evas_Object *popup) {
-    const char *told = popup ? efl_access_object_description_get(popup) : nullptr;
-    return told ? told : "";
-  }
-  std::string size_text() { return text(view()->bottom, "elm.text"); }
-
-  std::vector<std::string> attached() {
-    std::vector<std::string> names;
-    for (const GSList *link = view()->attachments; link; link = link->next)
-      names.push_back(tavro_file_name(static_cast<const char *>(link->data)));
-    return names;
-  }
-
-  static std::string query(const std::string &sql) {
-    TavroDb db;
-    sqlite3_open(TAVRO_DBMGR_FILE, tavro_out(db));
-    sqlite3_stmt *raw = nullptr;
-    EXPECT_EQ(sqlite3_prepare_v2(db.get(), sql.c_str(), -1, &raw, nullptr), SQLITE_OK) << sql;
-    const TavroStmt statement(raw);
-    const bool has_row = sqlite3_step(raw) == SQLITE_ROW && sqlite3_column_text(raw, 0);
-    return has_row ? reinterpret_cast<const char *>(sqlite3_column_text(raw, 0)) : "";
-  }
-  static int reports() { return std::stoi(query("SELECT count(*) FROM TABLE_VOC")); }
-  static std::string newest(const std::string &column) {
-    return query("SELECT " + column + " FROM TABLE_VOC_EXTENDED ORDER BY VOC_ID DESC LIMIT 1");
-  }
-
-  svc_voc_data *store_draft(const char *log = nullptr) {
-    tavro_dbmgr_bug_report_info report{};
-    report.submitted = TAVRO_STATUS_DRAFT_SAVED;
-    report.title_description = TAVRO_STRDUP("kept");
-    report.syslog_file = TAVRO_STRDUP(log);
-    const int id = tavro_dbmgr_update_bug_report(&report);
-    TAVRO_FREE(report.title_description);
-    TAVRO_FREE(report.type);
-    TAVRO_FREE(report.syslog_file);
-    return tavro_dbmgr_get_voc_by_id(id);
-  }
-
-  appdata ad_{};
-};
 
 TEST_F(Compose, AttachesAFileOnceAndAddsUpWhatIsThere) {
   tavro_create_problem_page(&ad_, nullptr);
@@ -187,8 +33,8 @@ TEST_F(Compose, NamesEachFileThatItRefusesWithTheReason) {
                          make_file("empty.jpg", ""),
                          make_file("text.jpg", "no picture at all"),
                          make_picture("huge.jpg", off_t{4} << 30),
-                         std::string(kMedia) + "gone.jpg",
-                         kMedia};
+                         std::string(kComposeMedia) + "gone.jpg",
+                         kComposeMedia};
   GSList *list = nullptr;
   for (std::string &path : paths) list = g_slist_append(list, path.data());
   tavro_compose_attach_files(&ad_, list);
@@ -378,141 +224,6 @@ TEST_F(Compose, DraftThatIsStoredAnewKeepsItsLogAndLosesOneThatWasReplaced) {
     EXPECT_EQ(std::filesystem::exists(log), !is_replaced);
     EXPECT_EQ(newest("REF_2"), is_replaced ? other : log);
   }
-}
-
-// ---- The system log ----
-
-class ComposeLog : public Compose {
- protected:
-  void SetUp() override {
-    std::filesystem::create_directories(TAVRO_LOG_DUMP_FOLDER);
-    Compose::SetUp();
-  }
-
-  // A crash service that takes its time: the test answers for it.
-  static void start_service() {
-    static TavroObject<GDBusConnection> bus(g_dbus_connection_new_for_address_sync(
-        getenv("DBUS_SYSTEM_BUS_ADDRESS"),
-        GDBusConnectionFlags(G_DBUS_CONNECTION_FLAGS_AUTHENTICATION_CLIENT |
-                             G_DBUS_CONNECTION_FLAGS_MESSAGE_BUS_CONNECTION),
-        nullptr, nullptr, nullptr));
-    const TavroVariant reply(
-        g_dbus_connection_call_sync(bus.get(), "org.freedesktop.DBus", "/", "org.freedesktop.DBus",
-                                    "RequestName", g_variant_new("(su)", TAVRO_CRASH_SERVICE, 0u), nullptr,
-                                    G_DBUS_CALL_FLAGS_NONE, -1, nullptr, nullptr));
-  }
-  std::string service_answers(const char *name) {
-    const std::string path = std::string(TAVRO_LOG_DUMP_FOLDER) + name;
-    std::ofstream(path) << std::string(2048, 'l');
-    TavroAppControl request;
-    app_control_create(tavro_out(request));
-    app_control_set_operation(request.get(), TAVRO_DUMP_LOG_OPERATION);
-    app_control_add_extra_data(request.get(), TAVRO_DUMP_LOG_FILE, name);
-    tavro_take_dump_log(request.get(), &ad_);
-    return path;
-  }
-  std::string row() { return text(view()->log_row, "elm.text.sub"); }
-  void turn_switch(bool is_on) {
-    elm_check_state_set(view()->log_row, is_on);
-    evas_object_smart_callback_call(view()->log_row, "changed", nullptr);
-  }
-};
-
-// Before any service runs: the phone has none.
-TEST_F(ComposeLog, PhoneThatMakesNoLogDoesNotKeepAReportBack) {
-  write_problem("IDS_OB_MBODY_BATTERY");
-  const int before = reports();
-  ASSERT_TRUE(wait_for([this] { return tavro_system_log_current(&ad_) == TAVRO_SYSTEM_LOG_FAILED; }));
-  EXPECT_FALSE(elm_object_disabled_get(view()->log_row)) << "it can be tried again";
-  tap_send();
-  ASSERT_TRUE(answer(ad_.cancel_popup, "IDS_OB_BUTTON_SEND_WITHOUT_LOG"));
-  EXPECT_EQ(reports(), before + 1);
-}
-
-TEST_F(ComposeLog, TargetThatNeedsALogGetsItAndAnotherGivesItUp) {
-  start_service();
-  write_problem("IDS_OB_MBODY_BATTERY");
-  EXPECT_EQ(tavro_system_log_current(&ad_), TAVRO_SYSTEM_LOG_COLLECTING);
-  EXPECT_TRUE(elm_check_state_get(view()->log_row));
-  EXPECT_TRUE(elm_object_disabled_get(view()->log_row));
-  const std::string path = service_answers("needed.zip");
-  EXPECT_THAT(row(), HasSubstr("2 kB"));
-  // The person chooses another target.
-  TAVRO_FREE(view()->app_name);
-  view()->app_name = TAVRO_STRDUP("Calculator");
-  tavro_compose_log_update(&ad_);
-  EXPECT_FALSE(elm_check_state_get(view()->log_row));
-  EXPECT_FALSE(std::filesystem::exists(path)) << "the person never asked for it";
-}
-
-TEST_F(ComposeLog, SettingSwitchesTheLogOnButDoesNotMakeAnEmptyScreenWorthKeeping) {
-  start_service();
-  preference_set_boolean(TAVRO_PREF_ATTACH_LOGS, true);
-  const int before = reports();
-  for (const bool is_end_of_all : {false, true}) {
-    tavro_create_problem_page(&ad_, nullptr);
-    settle();
-    const std::string path = service_answers("default.zip");
-    ASSERT_TRUE(ad_.problem_view->syslog_filepath);
-    EXPECT_TRUE(elm_check_state_get(view()->log_row));
-    if (is_end_of_all)
-      tavro_autosave_at_end(&ad_);
-    else
-      elm_naviframe_item_pop(ad_.nf);
-    EXPECT_FALSE(view());
-    EXPECT_EQ(reports(), before);
-    EXPECT_FALSE(std::filesystem::exists(path)) << "nobody would ever delete it";
-  }
-}
-
-TEST_F(ComposeLog, SendingWithoutTheLogIsForgottenWhenThePersonGoesBackAndSwitchesItOn) {
-  start_service();
-  preference_set_boolean(TAVRO_PREF_SENT_PAGE_SEEN, false);
-  write_problem();
-  turn_switch(true);
-  tap_send();
-  ASSERT_TRUE(answer(ad_.cancel_popup, "IDS_OB_BUTTON_SEND_WITHOUT_LOG"));
-  settle();
-  ASSERT_NE(elm_naviframe_top_item_get(ad_.nf), view()->nf_it);
-  elm_naviframe_item_pop(ad_.nf);
-  settle();
-  turn_switch(true);
-  tavro_compose_review(&ad_);
-  settle();
-  tavro_compose_send_from_review(&ad_);
-  ASSERT_TRUE(view()) << "it waits for the log";
-  service_answers("given-up.zip");
-  const std::string path = service_answers("wanted.zip");
-  EXPECT_FALSE(view());
-  EXPECT_EQ(newest("REF_2"), path);
-}
-
-TEST_F(ComposeLog, ReportWaitsForItsLogAndThenGoesByItself) {
-  start_service();
-  write_problem();
-  turn_switch(true);
-  const int before = reports();
-  tap_send();
-  EXPECT_EQ(reports(), before);
-  const std::string path = service_answers("awaited.zip");
-  EXPECT_EQ(reports(), before + 1);
-  EXPECT_EQ(newest("REF_2"), path);
-  EXPECT_FALSE(ad_.cancel_popup);
-}
-
-TEST_F(ComposeLog, PersonWhoKeepsWritingIsNotSentAwayByALateLog) {
-  start_service();
-  write_problem();
-  turn_switch(true);
-  tap_send();
-  const int before = reports();
-  ASSERT_TRUE(answer(ad_.cancel_popup, "IDS_OB_BUTTON_STAY"));
-  service_answers("late.zip");
-  EXPECT_TRUE(view());
-  EXPECT_EQ(reports(), before);
-  EXPECT_EQ(size_text(), "0.0 of 30.0 MB");
-  turn_switch(false);
-  EXPECT_FALSE(ad_.problem_view->syslog_filepath);
 }
 
 }  // namespace

@@ -1,8 +1,5 @@
 // A compose screen that ends without its content being stored or discarded, and the next start; files that
 // other applications share. Widgets are real and painted into memory.
-#define EFL_BETA_API_SUPPORT  // reading what a screen reader is told
-#include <Elementary.h>
-#include <elm_atspi.h>
 #include <gmock/gmock.h>
 #include <sys/resource.h>
 #include <sys/stat.h>
@@ -10,8 +7,7 @@
 #include <filesystem>
 #include <fstream>
 
-#include "tavro-common.h"
-#include "tavro-main.h"
+#include "screens_world.h"
 #include "tavro_app_control_handle.h"
 #include "tavro_appdata.h"
 #include "tavro_autosave.h"
@@ -47,17 +43,8 @@ std::string make_picture(const std::string &path, const std::string &head = "\xF
   return path;
 }
 
-class Keeper : public testing::Test {
+class Keeper : public Screens {
  protected:
-  static void SetUpTestSuite() {
-    setenv("ELM_ENGINE", "buffer", 1);
-    char name[] = "keeper_test", *arguments[] = {name, nullptr};
-    elm_init(1, arguments);
-    tavro_dbmgr_init_semaphore();
-    tavro_dbmgr_ensure_schema();
-  }
-  static void TearDownTestSuite() { elm_shutdown(); }
-
   void SetUp() override {
     preference_set_string(TAVRO_PREF_USERNAME, "anna");
     make_picture(kPicture);
@@ -70,16 +57,8 @@ class Keeper : public testing::Test {
   }
 
   void start() {
-    tavro_initialize_application_data(&ad_);
-    ASSERT_TRUE(tavro_create_base_window(&ad_));
-    tavro_create_landing_page(&ad_);
+    Screens::start();
     tavro_compose_keeper_offer(&ad_);
-  }
-  // As a kill ends the process: nothing is stored, nothing is removed.
-  void end() {
-    evas_object_del(ad_.win);
-    ecore_main_loop_iterate();
-    tavro_dealloc_memory(&ad_);
   }
   void die_and_start() {
     tavro_compose_keeper_note();
@@ -97,32 +76,16 @@ class Keeper : public testing::Test {
     tavro_create_problem_page(&ad_, nullptr);
     write(title, text);
   }
-  static Evas_Object *find_button(Evas_Object *below, const char *name) {
-    if (elm_object_widget_check(below) && g_strcmp0(efl_access_object_i18n_name_get(below), name) == 0)
-      return below;
-    const TavroHandle<Eina_List, eina_list_free> members(evas_object_smart_members_get(below));
-    Evas_Object *found = nullptr;
-    for (Eina_List *link = members.get(); link && !found; link = eina_list_next(link))
-      found = find_button(static_cast<Evas_Object *>(eina_list_data_get(link)), name);
-    return found;
-  }
+
   // Touch the button of the question that is shown: the topmost of that name.
   void answer(const char *name) {
     ASSERT_TRUE(ad_.cancel_popup);
     Evas_Object *button = nullptr;
     for (Evas_Object *top = evas_object_top_get(evas_object_evas_get(ad_.win)); top && !button;
          top = evas_object_below_get(top))
-      button = find_button(top, name);
+      button = find_button(top, tavro_text(name));
     ASSERT_TRUE(button) << name;
     evas_object_smart_callback_call(button, "clicked", nullptr);
-  }
-  // Until the page that was pushed or popped last has come to rest.
-  static void settle() {
-    const double end = ecore_time_get() + 1.0;
-    while (ecore_time_get() < end) {
-      ecore_main_loop_iterate();
-      g_usleep(5000);
-    }
   }
   std::string question() {
     return ad_.cancel_popup ? efl_access_object_description_get(ad_.cancel_popup) : "";
@@ -160,8 +123,6 @@ class Keeper : public testing::Test {
     __tavro_app_battery_capacity_changed_cb(DEVICE_CALLBACK_BATTERY_CAPACITY,
                                             reinterpret_cast<void *>(static_cast<intptr_t>(percent)), &ad_);
   }
-
-  appdata ad_{};
 };
 
 TEST_F(Keeper, GivesBackAllThatAScreenHeldWhateverItsKind) {
@@ -475,7 +436,7 @@ TEST_F(Share, NamesFilesAndTextBeyondTheLimits) {
   while (lines.size() < 1024 * 1024 - 60) lines += std::string(59, 'a') + "\n";
   lines += std::string(1024 * 1024 - 1 - lines.size(), 'b') + "\u00e4";
   share(std::vector<const char *>(102, kPicture), nullptr, lines.c_str());
-  EXPECT_EQ(question(), "IDS_OB_BODY_PD_FILES_LEFT_OUT\nIDS_OB_BODY_TEXT_CUT");
+  EXPECT_EQ(question(), "Further files (2): too many at once\nThe end of the text: it is too long");
   const TavroHandle<char, free> text(elm_entry_markup_to_utf8(elm_entry_entry_get(ad_.problem_view->entry)));
   lines.resize(1024 * 1024 - 1);
   EXPECT_TRUE(lines == text.get());
