@@ -13,7 +13,7 @@ ROOT = pathlib.Path(__file__).resolve().parents[2]
 BUILD = pathlib.Path(os.environ.get("TAVRO_BUILD_DIR", ROOT / "build" / "debug"))
 
 
-def wait_until(condition, timeout=10.0, what="the condition"):
+def wait_until(condition, timeout=20.0, what="the condition"):
     """The first true value of condition(); AssertionError when there is none in time."""
     end = time.monotonic() + timeout
     while True:
