@@ -85,8 +85,9 @@ int app_control_is_extra_data_array(app_control_h app_control, const char *key, 
 /* Hand the request to the application that its app id names; the phone starts it if need be. The request is
  * copied: the handle may be destroyed right after. With a callback, that is called once, whatever happens and
  * however long it takes; without one, nothing comes back, but an unknown application is still an error here.
- * A view request without an application goes to the one that the machine has for the uri's type; it takes no
- * callback. */
+ * A view request without an application goes to the one that the machine has for the uri's type, one to the
+ * phone's browser or application store, where there is none, to the machine's for the uri's scheme; these
+ * take no callback. */
 int app_control_send_launch_request(app_control_h app_control, app_control_reply_cb callback,
                                     void *user_data);
 

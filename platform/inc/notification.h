@@ -1,8 +1,8 @@
 /* Notifications on the desktop's notification service, the phone's own where the machine has no desktop. A
  * handle is a form that its owner fills, posts, updates and frees; the posted notification outlives the
  * handle and the process. Nothing here waits for the service: a failure there is a log line. Touching a
- * notification sends its launch request, while the process that posted it runs. Texts are plain, never
- * markup. Main loop only. */
+ * notification sends its launch request, also when the process that posted it has ended. Texts are plain,
+ * never markup. Main loop only. */
 #pragma once
 
 #include <app_control.h>
@@ -66,9 +66,16 @@ int notification_set_launch_option(notification_h noti, notification_launch_opti
 /* Progress of an ongoing notification, 0.0 to 1.0. */
 int notification_set_progress(notification_h noti, double percentage);
 
+/* A name under which a later handle, also of another process, finds the notification. */
+int notification_set_tag(notification_h noti, const char *tag);
+/* A handle for what this application has posted under the tag and nobody has closed since; null when there is
+ * none. It has type and tag; texts, image and launch option are to be set anew before an update. */
+notification_h notification_load_by_tag(const char *tag);
+
 int notification_post(notification_h noti);
 /* Replace what this handle posted; posts when it posted nothing yet. */
 int notification_update(notification_h noti);
+/* What is deleted just before another one is posted is replaced by it, without a gap between the two. */
 int notification_delete(notification_h noti);
 /* Remove all notifications of this application and type, also those that an earlier process posted. */
 int notification_delete_all(notification_type_e type);

@@ -2,8 +2,7 @@
 
 #include <gio/gio.h>
 
-#include <string>
-
+#include "badge_link.h"
 #include "bus.h"
 #include "database.h"
 
@@ -11,26 +10,18 @@ namespace {
 
 using namespace platform;
 
-constexpr const char *kLauncherPath = "/org/tavro/Badge";
-constexpr const char *kLauncherInterface = "com.canonical.Unity.LauncherEntry";
 constexpr unsigned int kLargestCount = 0x7fffffff;
 
 bool is_app_id(const char *app_id) {
   return app_id && *app_id && g_utf8_validate(app_id, -1, nullptr);
 }
 
-// Launchers listen for the signal; nobody answers, and where there is no launcher nobody hears it.
-void tell_launcher(const char *app_id, unsigned int count) {
-  with_host_bus(HostBus::kSession, [entry = std::string(app_id), count](GDBusConnection *bus) {
-    if (!bus) return;
-    GVariantBuilder properties;
-    g_variant_builder_init(&properties, G_VARIANT_TYPE_VARDICT);
-    g_variant_builder_add(&properties, "{sv}", "count", g_variant_new_int64(count));
-    g_variant_builder_add(&properties, "{sv}", "count-visible", g_variant_new_boolean(count > 0));
-    const std::string uri = "application://" + entry + ".desktop";
-    g_dbus_connection_emit_signal(bus, nullptr, kLauncherPath, kLauncherInterface, "Update",
-                                  g_variant_new("(sa{sv})", uri.c_str(), &properties), nullptr);
-  });
+// Launchers forget what a program told them when it ends, so the desktop link speaks for all.
+void tell_desktop_link(const char *app_id) {
+  if (GDBusConnection *bus = phone_bus()) {
+    g_dbus_connection_emit_signal(bus, nullptr, kBadgePath, kBadgeInterface, kBadgeChanged,
+                                  g_variant_new("(s)", app_id), nullptr);
+  }
 }
 
 // Runs a statement that returns one row when it met the badge.
@@ -46,7 +37,7 @@ int change(const char *app_id, const char *sql, unsigned int count, int when_non
       [&is_met](sqlite3_stmt *) { return is_met = true; });
   if (code != SQLITE_DONE) return BADGE_ERROR_IO_ERROR;
   if (!is_met) return when_none;
-  tell_launcher(app_id, count);
+  tell_desktop_link(app_id);
   return BADGE_ERROR_NONE;
 }
 

@@ -75,7 +75,7 @@ bool Database::is_current() const {
 
 int Database::open_file(const std::string &path) {
   // SQLite takes over the mode of an existing file for the files beside it.
-  const ScopedFd file(::open(path.c_str(), O_RDWR | O_CREAT | O_CLOEXEC, kPrivateFileMode));
+  ScopedFd file(::open(path.c_str(), O_RDWR | O_CREAT | O_CLOEXEC, kPrivateFileMode));
   struct stat own;
   if (!file || fstat(file.get(), &own) != 0) {
     dlog_print(DLOG_ERROR, "PLATFORM", "cannot open %s: %s", path.c_str(), strerror(errno));
@@ -83,6 +83,9 @@ int Database::open_file(const std::string &path) {
   }
   device_ = own.st_dev;
   inode_ = own.st_ino;
+  // Closed before SQLite locks the file: closing it later would drop those locks, and another process that
+  // closes the file would then remove the write-ahead log under our hands.
+  file.reset();
   sqlite3 *opened = nullptr;
   int code = sqlite3_open_v2(path.c_str(), &opened, SQLITE_OPEN_READWRITE | SQLITE_OPEN_FULLMUTEX, nullptr);
   connection_.reset(opened);
@@ -150,8 +153,10 @@ Database &preference_database() {
       "CREATE TABLE IF NOT EXISTS preference(key TEXT PRIMARY KEY, type INTEGER NOT NULL, value) WITHOUT "
       "ROWID;"
       "CREATE TABLE IF NOT EXISTS badge(app_id TEXT PRIMARY KEY, count INTEGER NOT NULL) WITHOUT ROWID;"
-      "CREATE TABLE IF NOT EXISTS notification(server TEXT NOT NULL, id INTEGER NOT NULL,"
-      " app_id TEXT NOT NULL, type INTEGER NOT NULL, PRIMARY KEY(server, id)) WITHOUT ROWID");
+      "DROP TABLE IF EXISTS notification;"  // of an earlier version, without tags and launch requests
+      "CREATE TABLE IF NOT EXISTS posted_notification(app_id TEXT NOT NULL, tag TEXT NOT NULL,"
+      " server TEXT NOT NULL, id INTEGER NOT NULL, type INTEGER NOT NULL, receiver TEXT, request TEXT,"
+      " PRIMARY KEY(app_id, tag), UNIQUE(server, id)) WITHOUT ROWID");
   return database;
 }
 

@@ -163,19 +163,33 @@ int send_without_reply(const app_control_s &request) {
   return APP_CONTROL_ERROR_NONE;
 }
 
+int view_with(GAppInfo *viewer, std::string uri) {
+  if (!viewer) return APP_CONTROL_ERROR_APP_NOT_FOUND;
+  ErrorSlot error;
+  GList uris = {uri.data(), nullptr, nullptr};
+  if (g_app_info_launch_uris(viewer, &uris, nullptr, error.out())) return APP_CONTROL_ERROR_NONE;
+  dlog_print(DLOG_ERROR, "PLATFORM", "%s cannot show %s: %s", g_app_info_get_id(viewer), uri.c_str(),
+             error.text());
+  return APP_CONTROL_ERROR_LAUNCH_FAILED;
+}
+
 // Show what the address names in the application that the machine has for its type.
 int view_with_default_application(const app_control_s &request) {
   const ScopedGText guessed(g_content_type_guess(request.uri->c_str(), nullptr, 0, nullptr));
   const char *type = request.mime ? request.mime->c_str() : guessed.get();
   const ScopedObject<GAppInfo> viewer(g_app_info_get_default_for_type(type, FALSE));
-  if (!viewer) return APP_CONTROL_ERROR_APP_NOT_FOUND;
-  ErrorSlot error;
-  std::string uri = *request.uri;
-  GList uris = {uri.data(), nullptr, nullptr};
-  if (g_app_info_launch_uris(viewer.get(), &uris, nullptr, error.out())) return APP_CONTROL_ERROR_NONE;
-  dlog_print(DLOG_ERROR, "PLATFORM", "%s cannot show a %s: %s", g_app_info_get_id(viewer.get()), type,
-             error.text());
-  return APP_CONTROL_ERROR_LAUNCH_FAILED;
+  return view_with(viewer.get(), *request.uri);
+}
+
+// Applications that a phone has, in whose place a Linux machine has one for the scheme of the address.
+bool is_played_by_machine(const std::string &app_id) {
+  return app_id == "corvane.browser" || app_id == "org.tizen.tizenstore";
+}
+
+int view_with_scheme_handler(const app_control_s &request) {
+  const ScopedGText scheme(g_uri_parse_scheme(request.uri->c_str()));
+  const ScopedObject<GAppInfo> viewer(scheme ? g_app_info_get_default_for_uri_scheme(scheme.get()) : nullptr);
+  return view_with(viewer.get(), *request.uri);
 }
 
 }  // namespace
@@ -228,7 +242,10 @@ int app_control_send_launch_request(app_control_h app_control, app_control_reply
     return APP_CONTROL_ERROR_APP_NOT_FOUND;
   if (!phone_bus()) return APP_CONTROL_ERROR_LAUNCH_FAILED;
   if (!is_startable(*app_control->app_id) && !is_running(*app_control->app_id)) {
-    return APP_CONTROL_ERROR_APP_NOT_FOUND;
+    const bool is_view = app_control->uri && app_control->operation == APP_CONTROL_OPERATION_VIEW;
+    return is_view && !callback && is_played_by_machine(*app_control->app_id)
+               ? view_with_scheme_handler(*app_control)
+               : APP_CONTROL_ERROR_APP_NOT_FOUND;
   }
   if (!callback) return send_without_reply(*app_control);
   auto sent = std::make_unique<Sent>(Sent{*app_control, callback, user_data});

@@ -1,13 +1,12 @@
 #include "notification.h"
 
-#include <dlog.h>
-#include <glib.h>
-
-#include <memory>
 #include <new>
 #include <utility>
 
-#include "notification_server.h"
+#include "app_control_internal.h"
+#include "app_core.h"
+#include "notification_requests.h"
+#include "scoped.h"
 
 namespace {
 
@@ -15,36 +14,20 @@ using namespace platform;
 
 constexpr int kToastMs = 1500;
 
-struct DestroyRequest {
-  void operator()(app_control_h request) const { app_control_destroy(request); }
-};
-using LaunchOption = std::shared_ptr<app_control_s>;
-
 }  // namespace
 
 struct _notification {
-  notification_type_e type;
   NotificationContent content;
-  LaunchOption launch_option;
-  std::shared_ptr<PostedNotification> posted;  // null: never posted
+  bool is_posted = false;
 };
 
 namespace {
 
-void show(notification_h noti) {
-  if (!noti->posted) noti->posted = std::make_shared<PostedNotification>();
-  noti->posted->type = noti->type;
-  noti->posted->touched = nullptr;
-  if (noti->launch_option) {
-    noti->posted->touched = [option = noti->launch_option] {
-      const int result = app_control_send_launch_request(option.get(), nullptr, nullptr);
-      if (result != APP_CONTROL_ERROR_NONE) {
-        dlog_print(DLOG_ERROR, "PLATFORM", "a touched notification launched nothing: %s",
-                   get_error_message(result));
-      }
-    };
-  }
-  show_notification(noti->posted, noti->content);
+// Each notification is kept under a tag, so that others than this handle can reach it.
+void take_tag(notification_h noti) {
+  if (!noti->content.tag.empty()) return;
+  const ScopedGText unique(g_uuid_string_random());
+  noti->content.tag = std::string("untagged ") + unique.get();
 }
 
 bool is_text(const char *text) {
@@ -55,8 +38,9 @@ bool is_text(const char *text) {
 
 notification_h notification_create(notification_type_e type) {
   if (type != NOTIFICATION_TYPE_NOTI && type != NOTIFICATION_TYPE_ONGOING) return nullptr;
-  auto *noti = new (std::nothrow) _notification{type, {}, nullptr, nullptr};
+  auto *noti = new (std::nothrow) _notification;
   if (!noti) return nullptr;
+  noti->content.type = type;
   noti->content.is_ongoing = type == NOTIFICATION_TYPE_ONGOING;
   // What is going on stays until it is over; for how long news are shown is the desktop's to say.
   noti->content.expire_ms = noti->content.is_ongoing ? 0 : -1;
@@ -96,11 +80,11 @@ int notification_set_launch_option(notification_h noti, notification_launch_opti
   if (!noti || type != NOTIFICATION_LAUNCH_OPTION_APP_CONTROL || !option) {
     return NOTIFICATION_ERROR_INVALID_PARAMETER;
   }
-  app_control_h copy = nullptr;
-  if (app_control_clone(&copy, static_cast<app_control_h>(option)) != APP_CONTROL_ERROR_NONE) {
-    return NOTIFICATION_ERROR_OUT_OF_MEMORY;
-  }
-  noti->launch_option = LaunchOption(copy, DestroyRequest());
+  const auto *request = static_cast<app_control_h>(option);
+  const ScopedVariant arguments(g_variant_ref_sink(launch_arguments(*request)));
+  const ScopedGText printed(g_variant_print(arguments.get(), FALSE));
+  noti->content.receiver = request->app_id.value_or(application_id());
+  noti->content.request = printed.get();
   return NOTIFICATION_ERROR_NONE;
 }
 
@@ -110,9 +94,27 @@ int notification_set_progress(notification_h noti, double percentage) {
   return NOTIFICATION_ERROR_NONE;
 }
 
+int notification_set_tag(notification_h noti, const char *tag) {
+  if (!noti || !tag || !*tag || !is_text(tag)) return NOTIFICATION_ERROR_INVALID_PARAMETER;
+  noti->content.tag = tag;
+  return NOTIFICATION_ERROR_NONE;
+}
+
+notification_h notification_load_by_tag(const char *tag) {
+  if (!tag || !*tag || !is_text(tag)) return nullptr;
+  const std::optional<int> type = shown_notification_type(tag);
+  notification_h noti = type ? notification_create(static_cast<notification_type_e>(*type)) : nullptr;
+  if (!noti) return nullptr;
+  noti->content.tag = tag;
+  noti->is_posted = true;
+  return noti;
+}
+
 int notification_post(notification_h noti) {
   if (!noti) return NOTIFICATION_ERROR_INVALID_PARAMETER;
-  show(noti);
+  take_tag(noti);
+  noti->is_posted = true;
+  show_notification(noti->content);
   return NOTIFICATION_ERROR_NONE;
 }
 
@@ -122,8 +124,8 @@ int notification_update(notification_h noti) {
 
 int notification_delete(notification_h noti) {
   if (!noti) return NOTIFICATION_ERROR_INVALID_PARAMETER;
-  if (!noti->posted) return NOTIFICATION_ERROR_NOT_EXIST_ID;
-  close_notification(noti->posted);
+  if (!noti->is_posted) return NOTIFICATION_ERROR_NOT_EXIST_ID;
+  close_notification(noti->content.tag);
   return NOTIFICATION_ERROR_NONE;
 }
 
@@ -141,6 +143,6 @@ int notification_status_message_post(const char *message) {
   content.title = message;
   content.expire_ms = kToastMs;
   content.is_toast = true;
-  show_notification(std::make_shared<PostedNotification>(), std::move(content));
+  show_notification(std::move(content));
   return NOTIFICATION_ERROR_NONE;
 }

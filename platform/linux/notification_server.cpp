@@ -3,88 +3,102 @@
 #include <dlog.h>
 
 #include <algorithm>
-#include <map>
+#include <deque>
+#include <memory>
 #include <utility>
 #include <vector>
 
-#include "app_core.h"
 #include "bus.h"
 #include "database.h"
 
 namespace platform {
 namespace {
 
-using Posted = std::shared_ptr<PostedNotification>;
-
-constexpr const char *kService = "org.freedesktop.Notifications";
-constexpr const char *kPath = "/org/freedesktop/Notifications";
-constexpr const char *kDefaultAction = "default";
 constexpr int kCallTimeoutMs = 10'000;
 
-// What is on the screen and can still call back.
-std::map<guint32, Posted> &shown() {
-  static std::map<guint32, Posted> &all = *new std::map<guint32, Posted>;
-  return all;
+// A notification as the service knows it.
+struct Shown {
+  std::string server;
+  guint32 id;
+};
+
+struct Waiting {
+  NotificationStep step;
+  NotificationDone done;
+};
+
+struct Queue {
+  std::deque<Waiting> steps;
+  bool is_busy = false;       // the service is being asked for the first step
+  Shown inherited = {"", 0};  // what was to be closed, for the notification that comes next
+};
+
+Queue &queue() {
+  static Queue &instance = *new Queue;
+  return instance;
 }
 
-void advance(const Posted &posted);
+void advance();
 
-// Ids count anew when the service or its bus starts anew; this tells one run of the service from another.
-std::string server_of(GDBusConnection *bus, GDBusMessage *reply) {
-  const char *sender = g_dbus_message_get_sender(reply);
-  return std::string(g_dbus_connection_get_guid(bus)) + " " + (sender ? sender : "");
-}
+// A run of the service that answered, and whether it reads markup: such a service must be given escaped
+// text, the others would show the escapes.
+struct Server {
+  GDBusConnection *bus;
+  std::string address;
+  std::string name;
+  bool reads_markup;
+};
 
-void remember(const std::string &server, guint32 id, int type) {
+void remember(const NotificationStep &step, const Shown &shown) {
+  const NotificationContent &content = step.content;
+  const auto bind_some = [](sqlite3_stmt *statement, int index, const std::string &text) {
+    if (!text.empty()) bind_text(statement, index, text.c_str());
+  };
   preference_database().run(
-      "INSERT OR REPLACE INTO notification(server, id, app_id, type) VALUES(?1, ?2, ?3, ?4)",
+      "INSERT OR REPLACE INTO posted_notification(app_id, tag, server, id, type, receiver, request)"
+      " VALUES(?1, ?2, ?3, ?4, ?5, ?6, ?7)",
       [&](sqlite3_stmt *statement) {
-        bind_text(statement, 1, server.c_str());
-        sqlite3_bind_int64(statement, 2, id);
-        bind_text(statement, 3, application_id().c_str());
-        sqlite3_bind_int(statement, 4, type);
+        bind_text(statement, 1, step.app_id.c_str());
+        bind_text(statement, 2, content.tag.c_str());
+        bind_text(statement, 3, shown.server.c_str());
+        sqlite3_bind_int64(statement, 4, shown.id);
+        sqlite3_bind_int(statement, 5, content.type);
+        bind_some(statement, 6, content.receiver);
+        bind_some(statement, 7, content.request);
       });
 }
 
-void forget(guint32 id) {
-  preference_database().run("DELETE FROM notification WHERE id = ?1 AND app_id = ?2",
-                            [id](sqlite3_stmt *statement) {
-                              sqlite3_bind_int64(statement, 1, id);
-                              bind_text(statement, 2, application_id().c_str());
+void forget(const Shown &shown) {
+  preference_database().run("DELETE FROM posted_notification WHERE server = ?1 AND id = ?2",
+                            [&shown](sqlite3_stmt *statement) {
+                              bind_text(statement, 1, shown.server.c_str());
+                              sqlite3_bind_int64(statement, 2, shown.id);
                             });
 }
 
-void closed_cb(GDBusConnection *, const char *, const char *, const char *, const char *, GVariant *arguments,
-               gpointer) {
-  guint32 id;
-  if (!g_variant_is_of_type(arguments, G_VARIANT_TYPE("(uu)"))) return;
-  g_variant_get(arguments, "(uu)", &id, nullptr);
-  const auto known = shown().find(id);
-  if (known == shown().end()) return;
-  known->second->server_id = 0;
-  shown().erase(known);
-  forget(id);
+std::vector<Shown> shown_by(const char *sql, const Database::Bind &bind) {
+  std::vector<Shown> found;
+  preference_database().run(sql, bind, [&found](sqlite3_stmt *statement) {
+    found.push_back({column_text(statement, 0), static_cast<guint32>(sqlite3_column_int64(statement, 1))});
+    return true;
+  });
+  return found;
 }
 
-void action_cb(GDBusConnection *, const char *, const char *, const char *, const char *, GVariant *arguments,
-               gpointer) {
-  guint32 id;
-  const char *action;
-  if (!g_variant_is_of_type(arguments, G_VARIANT_TYPE("(us)"))) return;
-  g_variant_get(arguments, "(u&s)", &id, &action);
-  const auto known = shown().find(id);
-  if (known == shown().end() || std::string(action) != kDefaultAction) return;
-  const Posted posted = known->second;
-  if (posted->touched) posted->touched();
+std::vector<Shown> shown_under_tag(const NotificationStep &step) {
+  return shown_by("SELECT server, id FROM posted_notification WHERE app_id = ?1 AND tag = ?2",
+                  [&step](sqlite3_stmt *statement) {
+                    bind_text(statement, 1, step.app_id.c_str());
+                    bind_text(statement, 2, step.content.tag.c_str());
+                  });
 }
 
-void subscribe_once(GDBusConnection *bus) {
-  static bool is_subscribed = false;
-  if (std::exchange(is_subscribed, true)) return;
-  g_dbus_connection_signal_subscribe(bus, kService, kService, "NotificationClosed", kPath, nullptr,
-                                     G_DBUS_SIGNAL_FLAGS_NONE, closed_cb, nullptr, nullptr);
-  g_dbus_connection_signal_subscribe(bus, kService, kService, "ActionInvoked", kPath, nullptr,
-                                     G_DBUS_SIGNAL_FLAGS_NONE, action_cb, nullptr, nullptr);
+std::vector<Shown> shown_of_type(const NotificationStep &step) {
+  return shown_by("SELECT server, id FROM posted_notification WHERE app_id = ?1 AND type = ?2",
+                  [&step](sqlite3_stmt *statement) {
+                    bind_text(statement, 1, step.app_id.c_str());
+                    sqlite3_bind_int(statement, 2, step.content.type);
+                  });
 }
 
 using Answer = std::function<void(GDBusConnection *, GDBusMessage *)>;  // null message: it failed
@@ -100,8 +114,9 @@ void answered_cb(GObject *source, GAsyncResult *result, gpointer data) {
   (*answer)(bus, is_good ? reply.get() : nullptr);
 }
 
-void call(GDBusConnection *bus, const char *method, GVariant *arguments, Answer answer) {
-  const ScopedMessage message(g_dbus_message_new_method_call(kService, kPath, kService, method));
+void call(GDBusConnection *bus, const char *address, const char *method, GVariant *arguments, Answer answer) {
+  const ScopedMessage message(
+      g_dbus_message_new_method_call(address, kNotificationPath, kNotificationService, method));
   if (arguments) g_dbus_message_set_body(message.get(), arguments);
   hold_end();
   g_dbus_connection_send_message_with_reply(bus, message.get(), G_DBUS_SEND_MESSAGE_FLAGS_NONE,
@@ -109,22 +124,19 @@ void call(GDBusConnection *bus, const char *method, GVariant *arguments, Answer 
                                             new Answer(std::move(answer)));
 }
 
-// Services that read markup must be given escaped text; the others would show the escapes.
-enum class Markup { kUnknown, kRead, kIgnored };
-Markup markup = Markup::kUnknown;
-
-void take_capabilities(GDBusMessage *reply) {
-  GVariant *body = reply ? g_dbus_message_get_body(reply) : nullptr;
-  if (!body || !g_variant_is_of_type(body, G_VARIANT_TYPE("(as)"))) return;
+bool lists_markup(GDBusMessage *capabilities) {
+  GVariant *body = g_dbus_message_get_body(capabilities);
+  if (!body || !g_variant_is_of_type(body, G_VARIANT_TYPE("(as)"))) return false;
   const ScopedVariant names(g_variant_get_child_value(body, 0));
   const std::unique_ptr<const char *, FreeWith<g_free>> list(g_variant_get_strv(names.get(), nullptr));
-  markup = g_strv_contains(list.get(), "body-markup") ? Markup::kRead : Markup::kIgnored;
+  return g_strv_contains(list.get(), "body-markup");
 }
 
-GVariant *hints_of(const NotificationContent &content) {
+GVariant *hints_of(const NotificationStep &step) {
+  const NotificationContent &content = step.content;
   GVariantBuilder hints;
   g_variant_builder_init(&hints, G_VARIANT_TYPE_VARDICT);
-  g_variant_builder_add(&hints, "{sv}", "desktop-entry", g_variant_new_string(application_id().c_str()));
+  g_variant_builder_add(&hints, "{sv}", "desktop-entry", g_variant_new_string(step.app_id.c_str()));
   if (content.is_ongoing) g_variant_builder_add(&hints, "{sv}", "resident", g_variant_new_boolean(TRUE));
   if (content.is_toast) g_variant_builder_add(&hints, "{sv}", "transient", g_variant_new_boolean(TRUE));
   if (content.progress) {
@@ -134,126 +146,129 @@ GVariant *hints_of(const NotificationContent &content) {
   return g_variant_builder_end(&hints);
 }
 
-GVariant *notify_arguments(const PostedNotification &posted, const NotificationContent &content) {
+GVariant *notify_arguments(const NotificationStep &step, guint32 replaced, bool reads_markup) {
+  const NotificationContent &content = step.content;
   const ScopedGText escaped(g_markup_escape_text(content.body.c_str(), -1));
-  const char *with_action[] = {kDefaultAction, "", nullptr};
+  const char *with_action[] = {kTouchAction, "", nullptr};
   const char *without_action[] = {nullptr};
-  const std::string icon = content.icon_path.empty() ? application_id() : content.icon_path;
-  return g_variant_new("(susss^as@a{sv}i)", application_id().c_str(), posted.server_id, icon.c_str(),
-                       content.title.c_str(), markup == Markup::kRead ? escaped.get() : content.body.c_str(),
-                       posted.touched ? with_action : without_action, hints_of(content), content.expire_ms);
+  const std::string icon = content.icon_path.empty() ? step.app_id : content.icon_path;
+  return g_variant_new("(susss^as@a{sv}i)", step.app_id.c_str(), replaced, icon.c_str(),
+                       content.title.c_str(), reads_markup ? escaped.get() : content.body.c_str(),
+                       content.request.empty() ? without_action : with_action, hints_of(step),
+                       content.expire_ms);
 }
 
-void take_id(const Posted &posted, GDBusConnection *bus, GDBusMessage *reply) {
-  GVariant *body = g_dbus_message_get_body(reply);
-  if (!body || !g_variant_is_of_type(body, G_VARIANT_TYPE("(u)"))) return;
-  if (posted->server_id) shown().erase(posted->server_id);
-  g_variant_get(body, "(u)", &posted->server_id);
-  shown()[posted->server_id] = posted;
-  remember(server_of(bus, reply), posted->server_id, posted->type);
+void end_step(bool is_done) {
+  const NotificationDone done = std::move(queue().steps.front().done);
+  queue().steps.pop_front();
+  queue().is_busy = false;
+  done(is_done);
+  advance();
 }
 
-void notify(GDBusConnection *bus, const Posted &posted) {
-  const NotificationContent content = *std::exchange(posted->wanted, std::nullopt);
-  call(bus, "Notify", notify_arguments(*posted, content),
-       [posted, is_toast = content.is_toast](GDBusConnection *answered, GDBusMessage *reply) {
-         posted->is_busy = false;
-         if (reply && !is_toast) take_id(posted, answered, reply);
-         advance(posted);
+// The id that the content is to be shown under; 0: a new one.
+guint32 replaced_by(const NotificationStep &step, const Server &server) {
+  if (step.content.is_toast) return 0;
+  const Shown inherited = std::exchange(queue().inherited, {"", 0});
+  for (const Shown &shown : shown_under_tag(step)) {
+    if (shown.server == server.name) return shown.id;
+  }
+  return inherited.server == server.name ? inherited.id : 0;
+}
+
+void show(const Server &server, const NotificationStep &step) {
+  call(server.bus, server.address.c_str(), "Notify",
+       notify_arguments(step, replaced_by(step, server), server.reads_markup),
+       [step, name = server.name](GDBusConnection *, GDBusMessage *reply) {
+         GVariant *body = reply ? g_dbus_message_get_body(reply) : nullptr;
+         const bool is_shown = body && g_variant_is_of_type(body, G_VARIANT_TYPE("(u)"));
+         if (is_shown && !step.content.is_toast) {
+           Shown shown{name, 0};
+           g_variant_get(body, "(u)", &shown.id);
+           remember(step, shown);
+         }
+         end_step(is_shown);
        });
 }
 
-void close_on_server(GDBusConnection *bus, const Posted &posted) {
-  posted->is_close_wanted = false;
-  const guint32 id = std::exchange(posted->server_id, 0);
-  if (id == 0) {
-    posted->is_busy = false;
-    return;
-  }
-  shown().erase(id);
-  forget(id);
-  call(bus, "CloseNotification", g_variant_new("(u)", id), [posted](GDBusConnection *, GDBusMessage *) {
-    posted->is_busy = false;
-    advance(posted);
-  });
+// Whether the same application shows something new right behind the step that is being taken.
+bool is_new_notification_next() {
+  const auto &steps = queue().steps;
+  if (steps.size() < 2) return false;
+  const NotificationStep &next = steps[1].step;
+  return next.kind == NotificationStep::kShow && next.app_id == steps[0].step.app_id &&
+         !next.content.is_toast && shown_under_tag(next).empty();
 }
 
-void act(GDBusConnection *bus, const Posted &posted) {
-  if (posted->wanted) {
-    notify(bus, posted);
-  } else {
-    close_on_server(bus, posted);
+void close(const Server &server, const std::vector<Shown> &found) {
+  // What is on the screen becomes the one that follows, so that there is never a moment with none or both.
+  // Its row stays until then: a process that dies in between leaves a notification that can be closed.
+  if (!found.empty() && found.back().server == server.name && is_new_notification_next()) {
+    queue().inherited = found.back();
   }
-}
-
-// Take the next step towards what is wanted. One call at a time, because the next one needs the id that the
-// first one brings.
-void advance(const Posted &posted) {
-  if (posted->is_busy || (!posted->wanted && !posted->is_close_wanted)) return;
-  posted->is_busy = true;
-  with_host_bus(HostBus::kSession, [posted](GDBusConnection *bus) {
-    if (!bus) {
-      posted->is_busy = false;
-      return;
+  for (const Shown &shown : found) {
+    const bool is_there = shown.server == server.name;
+    if (is_there && shown.id == queue().inherited.id) continue;
+    forget(shown);
+    if (is_there) {
+      g_dbus_connection_call(server.bus, server.address.c_str(), kNotificationPath, kNotificationService,
+                             "CloseNotification", g_variant_new("(u)", shown.id), nullptr,
+                             G_DBUS_CALL_FLAGS_NONE, -1, nullptr, nullptr, nullptr);
     }
-    subscribe_once(bus);
-    if (markup != Markup::kUnknown) return act(bus, posted);
-    call(bus, "GetCapabilities", nullptr, [posted](GDBusConnection *answered, GDBusMessage *reply) {
-      take_capabilities(reply);
-      if (reply) return act(answered, posted);
-      // Nobody shows notifications here; a later one asks again.
-      posted->wanted.reset();
-      posted->is_close_wanted = false;
-      posted->is_busy = false;
-    });
+  }
+  end_step(true);
+}
+
+std::vector<Shown> to_close(const NotificationStep &step) {
+  return step.kind == NotificationStep::kClose ? shown_under_tag(step) : shown_of_type(step);
+}
+
+// Nobody shows notifications here, now; what comes later asks again.
+void drop_all() {
+  queue().is_busy = false;
+  queue().inherited = {"", 0};
+  for (const Waiting &waiting : std::exchange(queue().steps, {})) waiting.done(false);
+}
+
+// The answer tells which run of the service this is; all that follows goes to that run alone, so that no id
+// can meet another run's notification.
+void take_step(GDBusConnection *bus, GDBusMessage *capabilities) {
+  const NotificationStep &step = queue().steps.front().step;
+  const char *address = g_dbus_message_get_sender(capabilities);
+  const Server server = {bus, address ? address : kNotificationService, notification_server_of(bus, address),
+                         lists_markup(capabilities)};
+  if (step.kind == NotificationStep::kShow) return show(server, step);
+  close(server, to_close(step));
+}
+
+// What has nothing to close needs no service.
+bool is_empty(const NotificationStep &step) {
+  return step.kind != NotificationStep::kShow && to_close(step).empty();
+}
+
+void advance() {
+  if (queue().is_busy || queue().steps.empty()) return;
+  queue().is_busy = true;
+  if (is_empty(queue().steps.front().step)) return end_step(true);
+  with_host_bus(HostBus::kSession, [](GDBusConnection *bus) {
+    if (!bus) return drop_all();
+    call(bus, kNotificationService, "GetCapabilities", nullptr,
+         [](GDBusConnection *answered, GDBusMessage *reply) {
+           if (!reply) return drop_all();
+           take_step(answered, reply);
+         });
   });
 }
 
 }  // namespace
 
-void show_notification(const Posted &notification, NotificationContent content) {
-  notification->wanted = std::move(content);
-  notification->is_close_wanted = false;
-  advance(notification);
+void take_notification_step(NotificationStep step, NotificationDone done) {
+  queue().steps.push_back({std::move(step), std::move(done)});
+  advance();
 }
 
-void close_notification(const Posted &notification) {
-  notification->wanted.reset();
-  notification->is_close_wanted = true;
-  advance(notification);
-}
-
-void close_notifications_of_type(int type) {
-  std::vector<Posted> own;
-  for (const auto &[id, posted] : shown()) {
-    if (posted->type == type) own.push_back(posted);
-  }
-  for (const Posted &posted : own) close_notification(posted);
-
-  std::vector<std::pair<std::string, guint32>> rows;
-  preference_database().run(
-      "DELETE FROM notification WHERE app_id = ?1 AND type = ?2 RETURNING server, id",
-      [type](sqlite3_stmt *statement) {
-        bind_text(statement, 1, application_id().c_str());
-        sqlite3_bind_int(statement, 2, type);
-      },
-      [&rows](sqlite3_stmt *statement) {
-        rows.emplace_back(column_text(statement, 0),
-                          static_cast<guint32>(sqlite3_column_int64(statement, 1)));
-        return true;
-      });
-  if (rows.empty()) return;
-  with_host_bus(HostBus::kSession, [rows](GDBusConnection *bus) {
-    if (!bus) return;
-    // Any answer of the service tells which run of it this is.
-    call(bus, "GetServerInformation", nullptr, [rows](GDBusConnection *answered, GDBusMessage *reply) {
-      for (const auto &[server, id] : rows) {
-        if (!reply || server != server_of(answered, reply)) continue;
-        call(answered, "CloseNotification", g_variant_new("(u)", id),
-             [](GDBusConnection *, GDBusMessage *) {});
-      }
-    });
-  });
+std::string notification_server_of(GDBusConnection *bus, const char *sender) {
+  return std::string(g_dbus_connection_get_guid(bus)) + " " + (sender ? sender : "");
 }
 
 }  // namespace platform

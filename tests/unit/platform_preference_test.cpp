@@ -75,6 +75,23 @@ TEST(Preference, IsOnTheDiskWhenTheCallReturns) {
   EXPECT_LE(stored, last_said + 1);
 }
 
+TEST(Preference, IsNotLostWhenAnotherProcessClosesTheFile) {
+  const auto value_elsewhere = [] {
+    return wait_for_end(
+        start({"/usr/bin/python3", "-c",
+               "import sqlite3, sys\n"
+               "database = sqlite3.connect('/opt/usr/dbspace/preference.db')\n"
+               "row = database.execute(\"SELECT value FROM preference WHERE key = 'shared'\")\n"
+               "value, = row.fetchone()\n"
+               "database.close()\n"
+               "sys.exit(int(value))"}));
+  };
+  preference_set_int("shared", 1);
+  EXPECT_EQ(value_elsewhere(), 1);
+  preference_set_int("shared", 2);
+  EXPECT_EQ(value_elsewhere(), 2);
+}
+
 TEST(Preference, FileIsTheUsersAloneAndADamagedOneIsSetAside) {
   ASSERT_EQ(preference_set_int("before", 1), 0);
   struct stat info;

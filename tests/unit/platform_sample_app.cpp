@@ -143,6 +143,13 @@ bool post_and_end(void *title) {
   notification_h noti = notification_create(NOTIFICATION_TYPE_ONGOING);
   notification_set_text(noti, NOTIFICATION_TEXT_TYPE_TITLE, static_cast<char *>(title), nullptr,
                         NOTIFICATION_VARIABLE_TYPE_NONE);
+  app_control_h request = nullptr;
+  app_control_create(&request);
+  app_control_set_app_id(request, "test.sample-service");
+  app_control_set_operation(request, "touched");
+  app_control_add_extra_data(request, "number", static_cast<char *>(title));
+  notification_set_launch_option(noti, NOTIFICATION_LAUNCH_OPTION_APP_CONTROL, request);
+  app_control_destroy(request);
   notification_post(noti);
   notification_free(noti);
   service_app_exit();

@@ -11,12 +11,14 @@
 
 #include <mutex>
 
+#include "desktop_link.h"
 #include "platform_support.h"
 
 namespace {
 
 using ::testing::ElementsAre;
 using ::testing::HasSubstr;
+using ::testing::Not;
 
 // A service of the machine, played by this process on the phone's bus over a connection of its own: it
 // answers with what the test laid down and writes down what it was asked.
@@ -110,54 +112,93 @@ const std::vector<std::pair<std::string, const char *>> kNotificationAnswers = {
 constexpr const char *kNotifications = "org.freedesktop.Notifications";
 constexpr const char *kNotificationsPath = "/org/freedesktop/Notifications";
 
-TEST(Notification, IsClosedAndShownAgainEscapedAndReplacedUnderItsId) {
+// What the tag stands for; an empty answer when nothing is shown under it.
+notification_h shown_under(const char *tag) {
+  notification_h noti = nullptr;
+  wait_for([&] { return (noti = notification_load_by_tag(tag)) != nullptr; });
+  return noti;
+}
+
+TEST(Notification, IsReplacedUnderItsIdAlsoByAnotherHandleUntilItIsClosed) {
   FakeService service(kNotifications, kNotificationAnswers);
-  notification_h noti = make_notification(NOTIFICATION_TYPE_ONGOING, "Sending", "<b>1 & 2</b>");
+  notification_h noti = make_notification(NOTIFICATION_TYPE_NOTI, "News", "<b>1 & 2</b>");
+  notification_set_tag(noti, "news");
   notification_post(noti);
-  ASSERT_TRUE(wait_for([&] { return service.calls("Notify").size() == 1; }));
-  wait_for([] { return false; }, 0.2);
+  notification_free(noti);
+  noti = shown_under("news");
+  ASSERT_TRUE(noti);
   notification_set_progress(noti, 0.5);
+  notification_update(noti);
+  ASSERT_TRUE(wait_for([&] { return service.calls("Notify").size() == 2; }));
+  EXPECT_THAT(service.calls("Notify")[0], HasSubstr("&lt;b&gt;1 &amp; 2&lt;/b&gt;"));
+  EXPECT_THAT(service.calls("Notify")[1], HasSubstr(", 7, "));
+  EXPECT_THAT(service.calls("Notify")[1], HasSubstr("'value': <50>"));
   notification_delete(noti);
   ASSERT_TRUE(wait_for([&] { return service.calls("CloseNotification").size() == 1; }));
   EXPECT_THAT(service.calls("CloseNotification")[0], "(7,)");
+  EXPECT_EQ(notification_load_by_tag("news"), nullptr);
   notification_post(noti);
-  ASSERT_TRUE(wait_for([&] { return service.calls("Notify").size() == 2; }));
-  wait_for([] { return false; }, 0.2);
-  notification_update(noti);
   ASSERT_TRUE(wait_for([&] { return service.calls("Notify").size() == 3; }));
-  EXPECT_THAT(service.calls("Notify")[2], HasSubstr(", 7, "));
-  EXPECT_THAT(service.calls("Notify")[2], HasSubstr("&lt;b&gt;1 &amp; 2&lt;/b&gt;"));
-  EXPECT_THAT(service.calls("Notify")[2], HasSubstr("'value': <50>"));
+  EXPECT_THAT(service.calls("Notify")[2], Not(HasSubstr(", 7, ")));
   notification_free(noti);
-  service.emit(kNotificationsPath, kNotifications, "NotificationClosed", "(@u 7, @u 2)");
 }
 
-TEST(Notification, SendsItsLaunchRequestWhenTouched) {
+TEST(Notification, OfAnotherRunOfTheServiceIsNotReplacedButShownAnew) {
+  notification_h noti = shown_under("news");
+  ASSERT_TRUE(noti);
+  FakeService service(kNotifications, kNotificationAnswers);
+  notification_update(noti);
+  ASSERT_TRUE(wait_for([&] { return service.calls("Notify").size() == 1; }));
+  EXPECT_THAT(service.calls("Notify")[0], Not(HasSubstr(", 7, ")));
+  notification_free(noti);
+}
+
+TEST(Notification, ThatIsDeletedBecomesTheOnePostedNext) {
+  FakeService service(kNotifications, kNotificationAnswers);
+  notification_h sending = make_notification(NOTIFICATION_TYPE_ONGOING, "sending", "");
+  notification_set_tag(sending, "sending");
+  notification_post(sending);
+  notification_free(sending);
+  ASSERT_TRUE(sending = shown_under("sending"));
+  notification_free(sending);
+  notification_delete_all(NOTIFICATION_TYPE_ONGOING);
+  notification_h sent = make_notification(NOTIFICATION_TYPE_NOTI, "sent", "");
+  notification_post(sent);
+  notification_free(sent);
+  ASSERT_TRUE(wait_for([&] { return service.calls("Notify").size() == 2; }));
+  EXPECT_THAT(service.calls("Notify")[1], HasSubstr(", 7, "));
+  EXPECT_TRUE(wait_for([] { return notification_load_by_tag("sending") == nullptr; }));
+  EXPECT_THAT(service.calls("CloseNotification"), ElementsAre());
+}
+
+// The link serves from here on, as it does in a phone.
+TEST(Notification, StartsWhatItNamesOnceWhenTouchedAfterItsPosterHasEnded) {
   FakeService service(kNotifications, kNotificationAnswers);
   make_startable(kService);
-  app_control_h request = nullptr;
-  app_control_create(&request);
-  app_control_set_app_id(request, kService.c_str());
-  app_control_set_operation(request, "touched");
-  notification_h noti = make_notification(NOTIFICATION_TYPE_NOTI, "news", "");
-  notification_set_launch_option(noti, NOTIFICATION_LAUNCH_OPTION_APP_CONTROL, request);
-  app_control_destroy(request);
-  notification_post(noti);
-  notification_free(noti);
-  ASSERT_TRUE(wait_for([&] { return service.calls("Notify").size() == 1; }));
-  wait_for([] { return false; }, 0.2);
-  service.emit(kNotificationsPath, kNotifications, "ActionInvoked", "(@u 7, 'default')");
-  EXPECT_TRUE(wait_for([] { return count_in_record(kService, "launch touched") == 1; }));
-  send(kService, "end");
-  EXPECT_TRUE(wait_for([] { return count_in_record(kService, "terminate") == 1; }));
-  unlink(("/opt/usr/" + kService + ".record").c_str());
-}
-
-TEST(Notification, LeavesTheProcessThatEndsRightAfterPostingIt) {
-  FakeService service(kNotifications, kNotificationAnswers);
-  EXPECT_EQ(wait_for_end(start({program_of(kService), "--post", "last words"})), 0);
+  ASSERT_TRUE(platform::start_desktop_link());
+  const auto post = [](const char *title) {
+    EXPECT_EQ(wait_for_end(start({program_of(kService), "--post", title})), 0);
+  };
+  const auto touch = [&](const char *arguments) {
+    service.emit(kNotificationsPath, kNotifications, "ActionInvoked", arguments);
+  };
+  post("last 'wörds\\");
   ASSERT_EQ(service.calls("Notify").size(), 1u);
-  EXPECT_THAT(service.calls("Notify")[0], HasSubstr("last words"));
+  touch("(@u 8, 'default')");
+  touch("(@u 7, 'other')");
+  touch("(@u 7, 'default')");
+  EXPECT_TRUE(wait_for([] { return count_in_record(kService, "launch touched last 'wörds\\") == 1; }));
+  service.emit(kNotificationsPath, kNotifications, "NotificationClosed", "(@u 7, @u 2)");
+  touch("(@u 7, 'default')");
+  send(kService, "end");
+  ASSERT_TRUE(wait_for([] { return count_in_record(kService, "terminate") == 1; }));
+  post("more words");
+  touch("(@u 7, 'default')");
+  EXPECT_TRUE(wait_for([] { return count_in_record(kService, "launch touched more words") == 1; }));
+  EXPECT_EQ(count_in_record(kService, "launch touched last 'wörds\\"), 1);
+  send(kService, "end");
+  EXPECT_TRUE(wait_for([] { return count_in_record(kService, "terminate") == 2; }));
+  unlink(("/opt/usr/" + kService + ".record").c_str());
 }
 
 TEST(Badge, KeepsItsCountForOtherProcessesAndOutOfThePreferences) {

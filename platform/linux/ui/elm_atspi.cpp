@@ -26,10 +26,17 @@ Efl_Access_State_Set states_of(Eo *control, void *) {
 
 void elm_atspi_accessible_name_set(Evas_Object *obj, const char *name) {
   EFL_OPS_DEFINE(overrides, EFL_OBJECT_OP_FUNC(efl_access_object_state_set_get, states_of));
-  efl_object_override(obj, &overrides);
+  const bool is_widget =
+      efl_isa(obj, EFL_CANVAS_OBJECT_CLASS);  // else an item, which tells its states itself
+  if (is_widget) efl_object_override(obj, &overrides);
   efl_access_object_i18n_name_set(obj, name);
 }
 
 void elm_atspi_accessible_description_set(Evas_Object *obj, const char *description) {
   efl_access_object_description_set(obj, description);
+}
+
+void elm_atspi_accessible_role_set(Evas_Object *obj, Elm_Atspi_Role role) {
+  static_assert(static_cast<int>(ELM_ATSPI_ROLE_ALERT) == static_cast<int>(EFL_ACCESS_ROLE_ALERT));
+  efl_access_object_role_set(obj, static_cast<Efl_Access_Role>(role));
 }

@@ -15,8 +15,10 @@
 #include "bus.h"
 #include "first_frame.h"
 #include "main_loop.h"
+#include "notification_requests.h"
 #include "screen_reader_keys.h"
 #include "system_info_source.h"
+#include "toast.h"
 #include "window_watch.h"
 
 struct app_event_handler {
@@ -125,6 +127,7 @@ bool start_toolkit(int argc, char **argv) {
   platform::merge_glib_into_ecore();
   platform::watch_windows(windows_changed);
   platform::share_keys_with_screen_reader();
+  platform::set_toast_fallback(platform::show_toast_over_window);
   return true;
 }
 
@@ -148,6 +151,7 @@ int run_application(int argc, char **argv) {
   if (is_created) run_loop();
   platform::leave_application(!is_created);
   if (is_created && app.callback.terminate) app.callback.terminate(app.user_data);
+  platform::set_toast_fallback(nullptr);
   platform::finish_outgoing();
   platform::stop_sharing_keys();
   platform::stop_watching_windows();
