@@ -15,6 +15,7 @@ install(FILES ${CMAKE_BINARY_DIR}/packaging/corvane.tavro-lite.desktop DESTINATI
 install(FILES ${PROJECT_SOURCE_DIR}/packaging/corvane.tavro-lite.svg
         DESTINATION share/icons/hicolor/scalable/apps)
 install(PROGRAMS ${CMAKE_BINARY_DIR}/bin/tavro-phone ${CMAKE_BINARY_DIR}/bin/tavro-desk
+                 ${CMAKE_BINARY_DIR}/bin/tavro-core-handler
         DESTINATION ${TAVRO_HOME}/bin)
 install(CODE "
   file(MAKE_DIRECTORY \"\$ENV{DESTDIR}\${CMAKE_INSTALL_PREFIX}/bin\")

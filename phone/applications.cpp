@@ -64,9 +64,10 @@ TavroVariant send_and_wait(GDBusConnection *bus, const LaunchRequest &request, s
   return reply;
 }
 
-ServiceKeeper::ServiceKeeper(GDBusConnection *bus) : bus_(bus) {
+ServiceKeeper::ServiceKeeper(GDBusConnection *bus, std::string app_id, std::string name)
+    : bus_(bus), app_id_(std::move(app_id)), name_(std::move(name)) {
   // The watch calls back at once with what is; the service does not run yet, so that starts it.
-  watch_ = g_bus_watch_name_on_connection(bus, kServiceId, G_BUS_NAME_WATCHER_FLAGS_NONE, appeared_cb,
+  watch_ = g_bus_watch_name_on_connection(bus, app_id_.c_str(), G_BUS_NAME_WATCHER_FLAGS_NONE, appeared_cb,
                                           vanished_cb, this, nullptr);
 }
 
@@ -89,7 +90,7 @@ void ServiceKeeper::vanished_cb(GDBusConnection *connection, const char *, gpoin
     start_cb(keeper);
     return;
   }
-  say("the upload service ended");
+  say(keeper->name_ + " ended");
   if (g_get_monotonic_time() - keeper->appeared_us_ > kSteadyAfterMicroseconds) keeper->delay_s_ = 1;
   keeper->start_later();
 }
@@ -104,9 +105,9 @@ gboolean ServiceKeeper::start_cb(gpointer self) {
   auto *keeper = static_cast<ServiceKeeper *>(self);
   keeper->start_source_ = 0;
   g_dbus_connection_call(keeper->bus_, "org.freedesktop.DBus", "/org/freedesktop/DBus",
-                         "org.freedesktop.DBus", "StartServiceByName", g_variant_new("(su)", kServiceId, 0u),
-                         G_VARIANT_TYPE("(u)"), G_DBUS_CALL_FLAGS_NONE, G_MAXINT, keeper->cancellable_.get(),
-                         started_cb, keeper);
+                         "org.freedesktop.DBus", "StartServiceByName",
+                         g_variant_new("(su)", keeper->app_id_.c_str(), 0u), G_VARIANT_TYPE("(u)"),
+                         G_DBUS_CALL_FLAGS_NONE, G_MAXINT, keeper->cancellable_.get(), started_cb, keeper);
   return G_SOURCE_REMOVE;
 }
 
@@ -114,8 +115,9 @@ void ServiceKeeper::started_cb(GObject *bus, GAsyncResult *result, gpointer self
   TavroError error;
   TavroVariant reply(g_dbus_connection_call_finish(G_DBUS_CONNECTION(bus), result, tavro_out(error)));
   if (reply || g_error_matches(error.get(), G_IO_ERROR, G_IO_ERROR_CANCELLED)) return;
-  say("the upload service cannot be started: " + plain_message(error.get()));
-  static_cast<ServiceKeeper *>(self)->start_later();
+  auto *keeper = static_cast<ServiceKeeper *>(self);
+  say(keeper->name_ + " cannot be started: " + plain_message(error.get()));
+  keeper->start_later();
 }
 
 int application_pid(GDBusConnection *bus, const std::string &app_id) {

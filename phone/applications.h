@@ -1,5 +1,6 @@
-// The phone's applications as the phone itself handles them: the upload service runs for as long as the phone
-// does, the client is shown once; both are asked to end before anything they need goes away. Main loop only.
+// The phone's applications as the phone itself handles them: the upload and the crash service run for as long
+// as the phone does, the client is shown once; both are asked to end before anything they need goes away.
+// Main loop only.
 #pragma once
 
 #include <string>
@@ -27,10 +28,11 @@ bool send_launch_request(GDBusConnection *bus, const LaunchRequest &request, std
 // The same, and wait for the reply, however long a person takes. Null with the reason; else (ia(ss)).
 TavroVariant send_and_wait(GDBusConnection *bus, const LaunchRequest &request, std::string *reason);
 
-// Keeps the upload service running: started at once, and again, later each time, when it is gone.
+// Keeps a service running: started at once, and again, later each time, when it is gone.
 class ServiceKeeper {
  public:
-  explicit ServiceKeeper(GDBusConnection *bus);
+  // `name` is for messages.
+  ServiceKeeper(GDBusConnection *bus, std::string app_id, std::string name);
   ServiceKeeper(const ServiceKeeper &) = delete;
   ServiceKeeper &operator=(const ServiceKeeper &) = delete;
   ~ServiceKeeper();
@@ -43,6 +45,7 @@ class ServiceKeeper {
   void start_later();
 
   GDBusConnection *bus_;
+  const std::string app_id_, name_;
   TavroObject<GCancellable> cancellable_{g_cancellable_new()};
   guint watch_ = 0;
   guint start_source_ = 0;

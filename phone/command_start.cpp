@@ -63,9 +63,8 @@ int report_running(const State &state) {
 }
 
 int run_phone(StartOptions options, const TavroFd &lock, int ready_fd) {
-  // What a direct-mode phone left behind when it was killed must not meet the new one.
-  const State last = read_state(options.folder);
-  if (last.count("mode") && last.at("mode") == "direct") kill_remains(options.folder);
+  // What a phone that was killed left behind must not meet the new one.
+  kill_remains(options.folder);
   const auto mode = choose_mode(options.folder);
   if (!mode) return kFailed;
   options.mode = *mode;

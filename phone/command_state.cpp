@@ -78,7 +78,7 @@ int command_stop(int argc, char **argv) {
   Folder folder;
   if (!read_folder(argc, argv, "End the phone and everything that it started.", &folder)) return kUsage;
   if (is_running(folder)) return stop_phone(folder);
-  if (value_of(read_state(folder), "mode") == "direct") kill_remains(folder);
+  kill_remains(folder);
   say("no phone runs in " + folder.dir);
   return kDone;
 }

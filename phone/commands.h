@@ -17,6 +17,10 @@ int command_exec(int argc, char **argv);
 int command_preference(int argc, char **argv);
 int command_screenshot(int argc, char **argv);
 int command_log(int argc, char **argv);
+int command_crash_handler(int argc, char **argv);
+
+// What stands between the phone and the desktop; runs inside the phone until it is ended.
+int command_desktop_link(int argc, char **argv);
 
 // The state of the phone that `--dir` means. False, after a message, when it does not run.
 bool find_running_phone(const std::string &dir_option, State *state);

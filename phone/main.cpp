@@ -24,7 +24,9 @@ constexpr Command kCommands[] = {
     {"screenshot", "take a picture of the phone's display", phone::command_screenshot},
     {"log", "print the platform log", phone::command_log},
     {"exec", "run a command inside the phone", phone::command_exec},
+    {"crash-handler", "let phones see this machine's crashes, or not", phone::command_crash_handler},
     {"supervise", nullptr, phone::command_supervise},
+    {"desktop-link", nullptr, phone::command_desktop_link},
 };
 
 void print_help() {
@@ -32,7 +34,7 @@ void print_help() {
       "Usage: tavro-phone COMMAND [OPTION …]\n\nA phone on this machine, with its own storage, message bus "
       "and feedback desk.\n\nCommands:");
   for (const Command &command : kCommands) {
-    if (command.summary) std::printf("  %-12s %s\n", command.name, command.summary);
+    if (command.summary) std::printf("  %-14s %s\n", command.name, command.summary);
   }
   std::puts(
       "\n\"tavro-phone COMMAND --help\" tells of a command's options.\n"

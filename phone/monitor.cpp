@@ -133,7 +133,7 @@ ExitStatus run_monitor(const StartOptions &options, const TavroFd &lock, int rea
   for (const int number : {SIGINT, SIGTERM, SIGHUP}) g_unix_signal_add(number, signal_cb, &monitor);
   while (!monitor.is_over) g_main_context_iteration(nullptr, TRUE);
   withdraw_ready(options.folder);  // the inner half did, unless it was killed
-  if (options.mode == Mode::kDirect) kill_remains(options.folder);
+  kill_remains(options.folder);
   return outcome(monitor);
 }
 

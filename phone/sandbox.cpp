@@ -13,6 +13,9 @@ namespace phone {
 
 namespace {
 
+constexpr int kKillTries = 200;
+constexpr gulong kKillPollMicroseconds = 10 * 1000;
+
 bool starts_with(const std::string &text, const std::string &prefix) {
   return text.compare(0, prefix.size(), prefix) == 0;
 }
@@ -38,6 +41,20 @@ std::string probe_sandbox(const Folder &folder) {
   if (status == 0) return "";
   const std::string said = g_strstrip(output.get());
   return "no sandbox can be made here: " + (said.empty() ? "bwrap failed" : said.substr(0, said.find('\n')));
+}
+
+// Whether there was one; a dead one that nobody has waited for does not count.
+bool kill_all(const Folder &folder, const std::vector<int> &spared) {
+  bool is_any_left = false;
+  TavroDir proc(opendir("/proc"));
+  while (const dirent *entry = proc ? readdir(proc.get()) : nullptr) {
+    const int pid = static_cast<int>(g_ascii_strtoll(entry->d_name, nullptr, 10));
+    if (pid <= 1 || std::find(spared.begin(), spared.end(), pid) != spared.end()) continue;
+    if (!carries_environment(pid, "TAVRO_PHONE_DIR=" + folder.dir)) continue;
+    kill(pid, SIGKILL);
+    is_any_left = true;
+  }
+  return is_any_left;
 }
 
 bool can_use_storage_root() {
@@ -89,12 +106,8 @@ std::vector<char *> exec_arguments(std::vector<std::string> &command) {
 void kill_remains(const Folder &folder) {
   std::vector<int> spared;
   for (int pid = getpid(); pid > 1; pid = parent_of(pid)) spared.push_back(pid);
-  TavroDir proc(opendir("/proc"));
-  while (const dirent *entry = proc ? readdir(proc.get()) : nullptr) {
-    const int pid = static_cast<int>(g_ascii_strtoll(entry->d_name, nullptr, 10));
-    if (pid <= 1 || std::find(spared.begin(), spared.end(), pid) != spared.end()) continue;
-    if (carries_environment(pid, "TAVRO_PHONE_DIR=" + folder.dir)) kill(pid, SIGKILL);
-  }
+  for (int tries = 0; kill_all(folder, spared) && tries < kKillTries; ++tries)
+    g_usleep(kKillPollMicroseconds);
 }
 
 }  // namespace phone

@@ -25,8 +25,9 @@ std::vector<std::string> sandboxed(Mode mode, const Folder &folder, std::vector<
 // Null-terminated pointers into `command` for an exec function.
 std::vector<char *> exec_arguments(std::vector<std::string> &command);
 
-// What processes of the phone in `folder` are left from a run in direct mode is killed: they carry the folder
-// in their environment. This process and its ancestors are spared.
+// What processes of the phone in `folder` are left from a run is killed: they carry the folder in their
+// environment. In direct mode nothing else ends them; those of a sandbox are dying, which takes a moment.
+// Waits for their end, two seconds at most. This process and its ancestors are spared.
 void kill_remains(const Folder &folder);
 
 }  // namespace phone

@@ -213,6 +213,9 @@ bool Supervisor::start_helpers() {
     // A desktop shows notifications itself. Without this one a phone works, but says less.
     add_program({"the notification daemon", notification_command(folder), environment_, nullptr, nullptr});
   }
+  // Before the applications, which may post at once.
+  if (!add_program({"the desktop link", {own_program(), "desktop-link"}, environment_, nullptr, nullptr}))
+    return false;
   open_accessibility();
   return true;
 }
@@ -229,10 +232,14 @@ void Supervisor::open_accessibility() {
 }
 
 void Supervisor::start_applications() {
-  if (is_installed(kServiceId)) {
-    service_keeper_ = std::make_unique<ServiceKeeper>(bus_.get());
-  } else {
-    say("there is no upload service at " + application_program(kServiceId));
+  const std::pair<const char *, const char *> services[] = {{kServiceId, "the upload service"},
+                                                            {kCrashServiceId, "the crash service"}};
+  for (const auto &[app_id, name] : services) {
+    if (is_installed(app_id)) {
+      service_keepers_.push_back(std::make_unique<ServiceKeeper>(bus_.get(), app_id, name));
+    } else {
+      say(std::string("there is no program of ") + name + " at " + application_program(app_id));
+    }
   }
   if (!options_.has_client) return;
   std::string reason;
@@ -252,7 +259,7 @@ void Supervisor::announce_ready() {
 
 // Applications first, while all they need is there; then everything else, last started first.
 void Supervisor::shut_down() {
-  service_keeper_.reset();
+  service_keepers_.clear();
   if (bus_) {
     for (const char *app_id : {kClientId, kServiceId, kCrashServiceId}) {
       end_application(bus_.get(), app_id, kApplicationPatienceMilliseconds);
@@ -307,7 +314,6 @@ std::string Supervisor::status_lines() const {
   }
   for (const char *app_id : {kServiceId, kClientId, kCrashServiceId}) {
     const int pid = bus_ ? application_pid(bus_.get(), app_id) : 0;
-    if (!pid && std::string(app_id) == kCrashServiceId) continue;
     text += std::string(app_id) + ": " + (pid ? "runs, pid " + std::to_string(pid) : "does not run") + "\n";
   }
   return text;

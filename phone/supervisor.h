@@ -86,7 +86,7 @@ class Supervisor {
   std::vector<std::unique_ptr<Program>> programs_;  // in the order of their start
   std::unique_ptr<AccessibilityForwarder> forwarder_;
   TavroObject<GDBusConnection> bus_;
-  std::unique_ptr<ServiceKeeper> service_keeper_;
+  std::vector<std::unique_ptr<ServiceKeeper>> service_keepers_;
   std::unique_ptr<ControlServer> control_;
 };
 

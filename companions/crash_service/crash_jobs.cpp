@@ -13,7 +13,6 @@
 namespace {
 
 constexpr char kClient[] = "corvane.tavro-lite";
-constexpr char kCrashFolder[] = "/opt/usr/share/crash/dump/";
 constexpr guint kJournalSeconds = 10;  // well below what the client waits for its log
 
 // A log that nobody is told of.
@@ -40,7 +39,7 @@ void answer(const std::string &file, const std::string &reason) {
 void delete_crash_folders() {
   std::error_code error;
   int count = 0;
-  for (std::filesystem::directory_iterator entry(kCrashFolder, error), end; !error && entry != end;
+  for (std::filesystem::directory_iterator entry(TAVRO_CRASH_DUMP_FOLDER, error), end; !error && entry != end;
        entry.increment(error)) {
     std::error_code failed;
     std::filesystem::remove_all(entry->path(), failed);

@@ -8,12 +8,14 @@
 #include <ctime>
 
 #include "crash_log.h"
+#include "limited_process.h"
 #include "tavro_handles.h"
 
 namespace {
 
 constexpr size_t kLargestSource = 1024 * 1024;  // bytes
 constexpr time_t kSeconds = 60 * 60;            // how far back a log reaches
+constexpr size_t kLongestLineStart = 256;       // bytes: time, priority, tag and process
 constexpr char kPlatformLog[] = "/opt/usr/share/log/platform.log";
 
 // Lines are bounded too: a journal is read from its old end.
@@ -97,8 +99,36 @@ std::string under_heading(const char *heading, const std::string &text) {
   return text.empty() ? text : std::string("---- ") + heading + " ----\n" + text;
 }
 
+// The lines "<time> <priority>/<tag>(<pid>): …" of one process; all when it wrote none, since what the others
+// did then is all there is to see.
+std::string lines_of(const std::string &text, int64_t pid) {
+  const std::string mark = "(" + std::to_string(pid) + "): ";
+  std::string lines;
+  for (size_t line = 0; line < text.size();) {
+    const size_t end = std::min(text.find('\n', line), text.size() - 1) + 1;
+    const std::string_view whole(text.data() + line, end - line);
+    if (whole.substr(0, kLongestLineStart).find(mark) != std::string_view::npos) lines += whole;
+    line = end;
+  }
+  return lines.empty() ? text : lines;
+}
+
+std::string read_program_journal(const std::string &executable, GCancellable *stop) {
+  if (executable.empty()) return "";
+  LimitedRun run;
+  run.command = {"journalctl",   "--quiet",     "--no-pager",    "--output=short-iso",
+                 "--since=-60m", "--lines=500", "--no-hostname", "_EXE=" + executable};
+  run.stop = stop;
+  return output_of(std::move(run), kLargestSource);
+}
+
 }  // namespace
 
 std::string collect_log(GCancellable *stop) {
   return under_heading("journal", read_journal(stop)) + under_heading("platform log", read_platform_log());
+}
+std::string collect_program_log(const Crash &crash, bool is_of_phone, GCancellable *stop) {
+  const int64_t pid = crash.phone_pid ? crash.phone_pid : crash.pid;
+  return under_heading("journal", read_program_journal(crash.executable, stop)) +
+         under_heading("platform log", is_of_phone ? lines_of(read_platform_log(), pid) : "");
 }

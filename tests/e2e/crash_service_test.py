@@ -8,10 +8,9 @@ import zipfile
 
 import pytest
 
-from phone_driver import BUILD, Phone, wait_until
+from phone_driver import Phone, wait_until
 
 SERVICE = "org.tizen.system.crash"
-PROGRAM = BUILD / "apps" / SERVICE / "bin" / SERVICE
 CALL = ["gdbus", "call", "--session", "-d", SERVICE, "-o", "/Org/Tizen/System/Crash/Crash", "-m"]
 
 
@@ -30,7 +29,7 @@ def phone(tmp_path):
 
 
 def make_journal(phone, words):
-    (phone.bin / "journalctl").write_text(f"#!/bin/sh\n{words}\n")
+    (phone.bin / "journalctl").write_text(f"#!/bin/sh\ncase $* in *--follow*) exec sleep 600 ;; esac\n{words}\n")
     (phone.bin / "journalctl").chmod(0o755)
 
 
@@ -77,8 +76,8 @@ def full_disk(phone):
     noise = "".join(platform_line(0, str(random.random())) for _ in range(2000))
     (phone.storage() / "share/log/platform.log.1").write_text(noise)
     # A file that may not grow; the answer's own line in the log comes from another program.
-    phone.execute("sh", "-c", f"trap '' XFSZ; ulimit -f 8; setsid {PROGRAM} >/dev/null 2>&1 </dev/null &")
-    wait_until(lambda: SERVICE in phone.status(), what="the service")
+    pid = wait_until(lambda: phone.status().get(SERVICE), what="the service")
+    phone.execute("prlimit", "--pid", str(pid), "--fsize=8192")
 
 
 def file_for_folder(phone):
@@ -128,4 +127,5 @@ def test_an_end_in_the_middle_leaves_no_file_and_starts_no_client(phone):
         phone.execute("kill", "-TERM", pid)
         wait_until(lambda: phone.execute("kill", "-0", pid, check=False).returncode, what="the end of the service")
     assert list(phone.logs.iterdir()) == []
+    wait_until(lambda: phone.status().get(SERVICE), what="its next start")
     assert "corvane.tavro-lite" not in phone.status() and answers(phone) == []

@@ -10,6 +10,7 @@ import stat
 import subprocess
 
 import pytest
+from desktop import Desktop
 from phone_driver import BUILD, Phone, wait_until
 
 CLIENT, SERVICE = "corvane.tavro-lite", "corvane.tavro-svc"
@@ -174,7 +175,8 @@ def test_a_phone_that_lost_a_vital_part_is_gone_and_can_be_started_again(phone, 
     assert CLIENT in phone.status()
 
 
-@pytest.mark.parametrize("part", ["the desk", "the window manager", "the notification daemon", SERVICE])
+@pytest.mark.parametrize("part", ["the desk", "the window manager", "the notification daemon", "the desktop link",
+                                  SERVICE])
 def test_a_helper_that_is_killed_is_started_again(phone, part):
     phone.start()
     wait_for_event(phone, "create", SERVICE)
@@ -337,25 +339,8 @@ def test_a_machine_that_allows_neither_sandbox_nor_storage_gets_one_clear_line(p
 
 @pytest.fixture
 def desktop(tmp_path):
-    """The environment of a desktop session: a display with a window manager, a bus with accessibility."""
-    read_end, write_end = os.pipe()
-    display = subprocess.Popen(["Xvfb", "-displayfd", str(write_end), "-screen", "0", "1000x800x24"],
-                               pass_fds=[write_end], stderr=subprocess.DEVNULL)
-    bus = subprocess.Popen(["dbus-daemon", "--session", "--nofork", "--print-address"], stdout=subprocess.PIPE,
-                           text=True, env={**os.environ, "XDG_RUNTIME_DIR": str(tmp_path), "GSETTINGS_BACKEND": "memory"},
-                           stderr=subprocess.DEVNULL)
-    os.close(write_end)
-    number = os.read(read_end, 16).decode().strip()
-    manager = subprocess.Popen(["openbox", "--sm-disable"], env={**os.environ, "DISPLAY": f":{number}"},
-                               stderr=subprocess.DEVNULL)
-    wait_until(lambda: "window id" in subprocess.run(
-        ["xprop", "-display", f":{number}", "-root", "_NET_SUPPORTING_WM_CHECK"], capture_output=True, text=True).stdout)
-    yield {"DISPLAY": f":{number}", "DBUS_SESSION_BUS_ADDRESS": bus.stdout.readline().strip(),
-           "WINDOW_MANAGER_PID": str(manager.pid)}
-    os.close(read_end)
-    for process in (manager, bus, display):
-        process.terminate()
-        process.wait()
+    with Desktop(tmp_path) as desktop:
+        yield desktop
 
 
 ADDRESS = ["gdbus", "call", "--session", "--dest", "org.a11y.Bus", "--object-path", "/org/a11y/bus", "--method",
@@ -366,13 +351,13 @@ SWITCH_READER_ON = [*ADDRESS[:-1], "org.freedesktop.DBus.Properties.Set", "org.a
 
 
 def test_on_a_desktop_the_phone_uses_its_display_its_bus_and_its_screen_reader(phone, desktop):
-    phone.environment.update(desktop)
+    phone.environment.update(desktop.environment)
     text = phone.command("start", "--detach").stdout
-    assert f"display={desktop['DISPLAY']}\n" in text
+    assert f"display={desktop.environment['DISPLAY']}\n" in text
     assert not {"the display server", "the window manager"} & set(phone.status())
     shown = phone.execute("sh", "-c", "echo $TAVRO_HOST_SESSION_BUS").stdout.strip()
-    assert shown == desktop["DBUS_SESSION_BUS_ADDRESS"]
-    host = {**os.environ, **desktop}
+    assert shown == desktop.environment["DBUS_SESSION_BUS_ADDRESS"]
+    host = {**os.environ, **desktop.environment}
     host_address = subprocess.run(ADDRESS, env=host, capture_output=True, text=True).stdout
     assert "unix:" in host_address and phone.execute(*ADDRESS).stdout == host_address
     assert "false" in phone.execute(*READER_IS_ON).stdout
@@ -381,15 +366,16 @@ def test_on_a_desktop_the_phone_uses_its_display_its_bus_and_its_screen_reader(p
 
 
 def test_on_a_display_without_a_window_manager_the_phone_draws_on_its_own(phone, desktop):
-    phone.environment.update(desktop)
-    os.kill(int(desktop["WINDOW_MANAGER_PID"]), signal.SIGKILL)
+    phone.environment.update(desktop.environment)
+    desktop.window_manager.kill()
+    desktop.window_manager.wait()
     started = phone.command("start", "--detach", "--no-client")
-    assert "has no window manager" in started.stderr and f"display={desktop['DISPLAY']}\n" not in started.stdout
+    assert "has no window manager" in started.stderr and f"display={desktop.environment['DISPLAY']}\n" not in started.stdout
     assert "the window manager" in phone.status()
 
 
 def test_a_headless_phone_leaves_the_desktop_of_its_user_alone(phone, desktop):
-    phone.environment.update(desktop)
+    phone.environment.update(desktop.environment)
     phone.start("--no-client")
-    assert phone.state["display"] != desktop["DISPLAY"] and "the window manager" in phone.status()
+    assert phone.state["display"] != desktop.environment["DISPLAY"] and "the window manager" in phone.status()
     assert phone.execute("sh", "-c", "echo $TAVRO_HOST_SESSION_BUS").stdout == "\n"
