@@ -20,6 +20,9 @@
 #include <glib.h>
 #include <sqlite3.h>
 
+#include <string>
+#include <vector>
+
 #define TAVRO_DBMGR_FOLDER "/opt/usr/apps/corvane.tavro-lite/shared/data"
 #define TAVRO_DBMGR_FILE TAVRO_DBMGR_FOLDER "/.tavro.db"
 
@@ -58,6 +61,8 @@ struct tavro_dbmgr_bug_report_info {
   int retry_count;
   char *push_comments;
   int isSending;
+  int follow_up_of;         // server id of the report that this one is a follow-up to; 0 for none
+  char *follow_up_verdict;  // of a follow-up
 };
 
 // An idea to be saved.
@@ -220,6 +225,18 @@ struct tavro_voc_filter {
 // The user's reports that match, out of all that are stored, newest change first, at most 100; else as above.
 GSList *tavro_dbmgr_search_vocs(const char *user_name, const tavro_voc_filter &filter);
 
+// Follow-ups: a report of its own by which the person says whether an answered one is settled. It names the
+// first report by the desk's id for it. The verdicts are stored and sent: never change them.
+#define TAVRO_DBMGR_STILL_HAPPENS "still_happens"
+#define TAVRO_DBMGR_WORKS_NOW "works_now"
+
+// Server id of the report that this one is a follow-up to, 0 when it is none, -1 when the store cannot be
+// read. A non-null `verdict` gets the stored one as a new text, or null.
+int tavro_dbmgr_get_follow_up(int voc_id, char **verdict);
+// Ids (GPOINTER_TO_INT; g_slist_free) of the newest 100 follow-ups to the report with this server id, oldest
+// first.
+GSList *tavro_dbmgr_get_follow_ups(int server_id);
+
 svc_voc_data *tavro_dbmgr_get_voc_by_id(int voc_id);
 svc_voc_data *tavro_dbmgr_get_voc_by_server_id(int server_id);
 GSList *tavro_dbmgr_get_attachments(int voc_id, sqlite3 *db);
@@ -232,10 +249,27 @@ GSList *tavro_dbmgr_get_vocs_to_send();
 int tavro_dbmgr_get_voc_count(const char *user_name);
 // 1 when a report has this server id, else 0; -1 when the file cannot be opened.
 int tavro_dbmgr_is_voc_present(int server_id);
+// Number of reports with this server id; -1 on failure, so that 0 says that there is none.
+int tavro_dbmgr_get_server_voc_count(int server_id);
 // 1 when the lookup ran, whether or not it found the name; -1 for null and on failure.
 int tavro_dbmgr_check_if_dump_file_is_uploaded(const char *dump_name);
 // 1 when a report of whichever user has this system log, 0 when none has; -1 for null and on failure.
 int tavro_dbmgr_is_syslog_file_stored(const char *path);
+
+// The files that stored reports name, as far as a name is not empty. `voc_ids` null: of all reports, which
+// reads the whole store. 0, or -1 on failure; `files` then has those that were read.
+enum tavro_voc_file_kind {
+  TAVRO_VOC_FILE_ATTACHMENT,
+  TAVRO_VOC_FILE_DEVICE_DATA,
+  TAVRO_VOC_FILE_SYSLOG,
+  TAVRO_VOC_FILE_DUMP,
+};
+struct tavro_voc_file {
+  tavro_voc_file_kind kind;
+  std::string path;
+  int voc_id;
+};
+int tavro_dbmgr_get_voc_files(const std::vector<int> *voc_ids, std::vector<tavro_voc_file> *files);
 
 // One column of one row as a new text; null when there is no row or no value.
 char *tavro_dbmgr_get_voc_title_description_by_id(int voc_id);
@@ -255,6 +289,10 @@ void tavro_dbmgr_destroy_vocs();
 // row last, so an end of the process in between leaves a report without title and attachments, to be deleted
 // again.
 void tavro_dbmgr_destroy_vocs_by_id(int voc_id);
+// Reports with their attachments and extension rows, in one transaction: all or, on failure, none. Left alone
+// is one that is being sent now. `destroyed` gets the others, those that were not there any more included. 0,
+// or -1 when the store refused.
+int tavro_dbmgr_destroy_vocs_by_ids(const std::vector<int> &voc_ids, std::vector<int> *destroyed);
 void tavro_dbmgr_destroy_attachments_by_filename(const char *file_path);
 // All reports of one kind, without their attachments and extension rows.
 void tavro_dbmgr_destroy_suggestions();
@@ -272,6 +310,9 @@ int tavro_dbmgr_update_server_voc_id(int voc_id, int server_id);
 int tavro_dbmgr_update_voc_retry_count(int voc_id, int count);
 // Upload attempts, -1 on failure.
 int tavro_dbmgr_get_voc_retry_count(int voc_id);
+// The current one of stored states: the text from the last entry that is not empty to the end, for an answer
+// may come without a status. Borrowed; null for null.
+const char *tavro_dbmgr_current_state(const char *states);
 int tavro_dbmgr_update_read_push_notifications(int voc_id, int is_read);
 // Reports of all users with an answer that was not seen yet; -1 on failure. The user is not looked at.
 int tavro_dbmgr_get_unread_push_notification_count(const char *user_name);

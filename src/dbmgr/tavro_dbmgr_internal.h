@@ -175,6 +175,12 @@ class store_row_reader {
 // The wall clock in milliseconds since the epoch (whole seconds) as decimal text.
 std::string store_now();
 void store_add_attachments(const GSList *attachments, int voc_id);
+// The extension row of a report that is a follow-up.
+void store_add_follow_up_extension(const tavro_dbmgr_bug_report_info *report, int voc_id);
+
+// The reports that `selection`, from FROM on, picks from TABLE_VOC, in its order, with their extension rows
+// and attachments.
+GSList *store_read_reports(sqlite3 *db, const statement_text &selection);
 
 // ---- What the save journal asks ----
 

@@ -44,7 +44,7 @@ void tavro_dbmgr_free_bug_report_data(tavro_dbmgr_bug_report_info *report) {
        {&report->type, &report->description, &report->title_description, &report->app_name, &report->severity,
         &report->dump_file, &report->date_of_creation, &report->date_of_updation, &report->dump_name,
         &report->syslog_file, &report->syslog_name, &report->device_data_filepath, &report->app_icon,
-        &report->user_name, &report->push_comments})
+        &report->user_name, &report->push_comments, &report->follow_up_verdict})
     TAVRO_FREE(*text);
   _tavro_free_attachement_list(report->attachments);
   TAVRO_FREE(report);

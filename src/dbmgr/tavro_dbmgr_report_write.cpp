@@ -122,6 +122,10 @@ void tavro_dbmgr_update_bug_report_extended(const tavro_dbmgr_bug_report_info *r
     TAVRO_LOGD("No Bug data");
     return;
   }
+  if (report->follow_up_of > 0) {
+    store_add_follow_up_extension(report, voc_id);
+    return;
+  }
   statement_text sql;
   sa_strcat(sql, "INSERT INTO TABLE_VOC_EXTENDED(VOC_ID, VOC_TITLE_TEXT, REF_2, REF_3) VALUES(");
   sa_strcat_values(sql, {std::to_string(voc_id).c_str(), report->title_description, report->syslog_file,

@@ -51,15 +51,17 @@ constexpr const char *kTableAfterBanner =
     "NTFCTN_READ_STATUS INTEGER, " TAVRO_FOUR_RESERVED("NTFCTN") ");";
 #undef TAVRO_FOUR_RESERVED
 
-// So that the history of a user with 100,000 reports opens as quickly as that of one with 100.
+// So that the history of a user with 100,000 reports opens as quickly as that of one with 100, and unread
+// answers are counted without a look at the others.
 constexpr const char *kIndexes[] = {
     "CREATE INDEX IF NOT EXISTS VOC_BY_USER_AND_CHANGE ON TABLE_VOC(VOC_USER_NAME, VOC_DATE_OF_UPDATION);",
     "CREATE INDEX IF NOT EXISTS VOC_EXTENDED_BY_VOC ON TABLE_VOC_EXTENDED(VOC_ID);",
     "CREATE INDEX IF NOT EXISTS ATTACHMENT_BY_VOC ON ATTACHMENT(ATTACHMENT_SUGGESTION_ID);",
+    "CREATE INDEX IF NOT EXISTS VOC_UNREAD ON TABLE_VOC(VOC_PUSH_READ) WHERE VOC_PUSH_READ = 0;",
 };
 
 constexpr int kTableCount = 9;
-constexpr int kIndexCount = 3;
+constexpr int kIndexCount = 4;
 constexpr const char *kCountTables =
     "SELECT count(*) FROM sqlite_master WHERE type = 'table' AND name IN ('ATTACHMENT', 'TABLE_VOC', "
     "'TABLE_USER_PROFILE', 'APP_CRASH', 'APP_DATA', 'TABLE_VOC_EXTENDED', 'TABLE_BETA_PROGRAM', "
@@ -90,7 +92,7 @@ constexpr const char *kNameTheColumns[] = {
 };
 constexpr const char *kCountIndexes =
     "SELECT count(*) FROM sqlite_master WHERE type = 'index' AND name IN ('VOC_BY_USER_AND_CHANGE', "
-    "'VOC_EXTENDED_BY_VOC', 'ATTACHMENT_BY_VOC');";
+    "'VOC_EXTENDED_BY_VOC', 'ATTACHMENT_BY_VOC', 'VOC_UNREAD');";
 
 constexpr char kSeedBannerRow[] = "BANNER_ID = 0 AND BANNER_SEQ_NO = 0";
 

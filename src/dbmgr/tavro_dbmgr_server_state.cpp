@@ -112,6 +112,13 @@ int tavro_dbmgr_get_voc_retry_count(int voc_id) {
   return store_read_number(store.db(), sql.c_str(), -1);
 }
 
+const char *tavro_dbmgr_current_state(const char *states) {
+  const char *current = states;
+  for (const char *at = states; at && *at; ++at)
+    if (*at == '#' && at[1] && at[1] != '#') current = at + 1;
+  return current;
+}
+
 int tavro_dbmgr_update_read_push_notifications(int voc_id, int is_read) {
   return _set_column(voc_id, "UPDATE TABLE_VOC SET VOC_PUSH_READ=", is_read);
 }

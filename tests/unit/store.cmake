@@ -3,9 +3,11 @@ tavro_unit_test(memcheck_test SOURCES unit/memcheck_test.cpp LIBS tavro_base)
 tavro_unit_test(store_test LIBS tavro_store SOURCES
   unit/store_schema_test.cpp
   unit/store_report_test.cpp
+  unit/store_search_test.cpp
   unit/store_server_state_test.cpp
   unit/store_catalogue_test.cpp
   unit/store_journal_test.cpp)
+target_include_directories(store_test PRIVATE ${PROJECT_SOURCE_DIR}/src)
 
 # Faults, in a program of their own: they take their time.
 tavro_unit_test(store_fault_test LIBS tavro_store SOURCES

@@ -133,7 +133,7 @@ TEST_F(StoreDamage, DamageOutsideTheTablesIsHealedWithoutLoss) {
     EXPECT_EQ(value("PRAGMA integrity_check"), "ok");
     EXPECT_EQ(value(in_history), "8");
     EXPECT_EQ(value("SELECT \"it's\" FROM ADDED_LATER"), "later");
-    EXPECT_EQ(value("SELECT count(*) FROM sqlite_master WHERE type = 'index' AND sql IS NOT NULL"), "3");
+    EXPECT_EQ(value("SELECT count(*) FROM sqlite_master WHERE type = 'index' AND sql IS NOT NULL"), "4");
     const Voc voc(tavro_dbmgr_get_voc_by_id(3));
     EXPECT_STREQ(voc->description, std::string(9000, 'x').c_str());
     EXPECT_EQ(g_slist_length(voc->attachments), 2u);

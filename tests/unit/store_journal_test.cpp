@@ -18,7 +18,12 @@ constexpr char kText[] = "it's\n not \xff text \\ 'x' ";
 
 class SaveJournal : public StoreWorld {
  protected:
-  static Problem report() { return problem_report("o'user", kText, {"/a \xfe.jpg", "/b", "/c"}); }
+  static Problem report() {
+    Problem report = problem_report("o'user", kText, {"/a \xfe.jpg", "/b", "/c"});
+    report->follow_up_of = 41;
+    report->follow_up_verdict = TAVRO_STRDUP(kText);
+    return report;
+  }
 
   static std::string rows() {
     return value(
@@ -37,6 +42,9 @@ class SaveJournal : public StoreWorld {
     EXPECT_STREQ(static_cast<tavro_dbmgr_attachment_info *>(voc->attachments->data)->file_path,
                  "/a \xfe.jpg");
     EXPECT_EQ(taken(tavro_dbmgr_get_device_data_file_by_id(id)), kText);
+    char *verdict = nullptr;
+    EXPECT_EQ(tavro_dbmgr_get_follow_up(id, &verdict), 41);
+    EXPECT_EQ(taken(verdict), kText);
   }
 };
 

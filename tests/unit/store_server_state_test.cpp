@@ -77,6 +77,8 @@ TEST_F(StoreServerState, SingleColumnsAreWrittenForOneReport) {
   EXPECT_EQ(tavro_dbmgr_get_voc_retry_count(99), -1);
   EXPECT_EQ(tavro_dbmgr_is_voc_present(9), 1);
   EXPECT_EQ(tavro_dbmgr_is_voc_present(8), 0);
+  EXPECT_EQ(tavro_dbmgr_get_server_voc_count(9), 1);
+  EXPECT_EQ(tavro_dbmgr_get_server_voc_count(8), 0);
   tavro_dbmgr_update_server_voc_id(other, 9);  // refused: another report has it
   EXPECT_EQ(column("VOC_ID_SERVER", other), "NULL");
 }
