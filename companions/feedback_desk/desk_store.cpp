@@ -26,6 +26,10 @@ CREATE TABLE IF NOT EXISTS answer(
   time INTEGER NOT NULL);
 CREATE INDEX IF NOT EXISTS answer_device ON answer(device, cursor);
 CREATE INDEX IF NOT EXISTS answer_report ON answer(report);
+CREATE TABLE IF NOT EXISTS follow_up(
+  report INTEGER PRIMARY KEY REFERENCES report(id), first INTEGER NOT NULL REFERENCES report(id),
+  verdict TEXT NOT NULL);
+CREATE INDEX IF NOT EXISTS follow_up_first ON follow_up(first);
 INSERT INTO sqlite_sequence(name, seq)
   SELECT 'report', 100000 + abs(random() % 900000000)
   WHERE NOT EXISTS(SELECT 1 FROM sqlite_sequence WHERE name = 'report');
@@ -33,7 +37,11 @@ INSERT INTO sqlite_sequence(name, seq)
 
 #define REPORT_COLUMNS                                                                                    \
   "id, device, kind, title, text, app, severity, user, created, received, status, is_complete, is_read, " \
-  "model, missing"
+  "model, missing, (SELECT first FROM follow_up WHERE follow_up.report = report.id), "                    \
+  "(SELECT verdict FROM follow_up WHERE follow_up.report = report.id), "                                  \
+  "(SELECT verdict FROM follow_up f JOIN report r ON r.id = f.report WHERE f.first = report.id AND "      \
+  "r.is_complete = 1 AND r.received > (SELECT ifnull(max(time), 0) FROM answer WHERE answer.report = "    \
+  "report.id) ORDER BY r.received DESC, r.id DESC LIMIT 1)"
 
 DeskReport _read_report(const Statement &row) {
   DeskReport report;
@@ -52,6 +60,9 @@ DeskReport _read_report(const Statement &row) {
   report.is_read = row.integer(12) != 0;
   report.model_json = row.text(13);
   report.missing_json = row.text(14);
+  report.follow_up_of = row.integer(15);
+  report.verdict = row.text(16);
+  report.last_verdict = row.text(17);
   return report;
 }
 
@@ -100,13 +111,18 @@ std::optional<std::string> DeskStore::device_of_token(const std::string &token_h
 }
 
 std::optional<int64_t> DeskStore::add_report(const std::string &key, const DeskReport &report) {
+  Transaction transaction(database_);
   const bool stored = database_.run(
       "INSERT INTO report(idempotency_key, device, kind, title, text, app, severity, user, created, status, "
       "model) VALUES(?, ?, ?, ?, ?, ?, ?, ?, ?, ?, ?) ON CONFLICT(idempotency_key) DO NOTHING",
       key, report.device, report.kind, report.title, report.text, report.app, report.severity, report.user,
       report.created_ms, DESK_STATUS_SUBMITTED, report.model_json);
-  if (!stored) return std::nullopt;
-  return report_of_key(key, report.device);
+  const auto id = stored ? report_of_key(key, report.device) : std::nullopt;
+  const bool is_whole = id && (report.follow_up_of == 0 ||
+                               database_.run("INSERT INTO follow_up(report, first, verdict) VALUES(?, ?, ?) "
+                                             "ON CONFLICT(report) DO NOTHING",
+                                             *id, report.follow_up_of, report.verdict));
+  return is_whole && transaction.commit() ? id : std::nullopt;
 }
 
 std::optional<int64_t> DeskStore::report_of_key(const std::string &key, const std::string &device) {
@@ -124,9 +140,25 @@ int64_t DeskStore::report_count(const std::string &device) {
 }
 
 bool DeskStore::complete_report(int64_t id, const std::string &missing_json) {
+  Transaction transaction(database_);
   return database_.run(
-      "UPDATE report SET is_complete = 1, missing = ?, received = ? WHERE id = ? AND is_complete = 0",
-      missing_json, now_ms(), id);
+             "UPDATE report SET is_read = 0 WHERE id = (SELECT first FROM follow_up JOIN report r ON "
+             "r.id = follow_up.report WHERE r.id = ? AND r.is_complete = 0 AND verdict = ?)",
+             id, DESK_VERDICT_STILL_HAPPENS) &&
+         database_.run(
+             "UPDATE report SET is_complete = 1, missing = ?, received = ? WHERE id = ? AND is_complete = 0",
+             missing_json, now_ms(), id) &&
+         transaction.commit();
+}
+
+std::vector<DeskReport> DeskStore::follow_ups(int64_t first) {
+  Statement rows = database_.prepare("SELECT " REPORT_COLUMNS
+                                     " FROM report WHERE is_complete = 1 AND id IN "
+                                     "(SELECT report FROM follow_up WHERE first = ?) ORDER BY received, id",
+                                     first);
+  std::vector<DeskReport> reports;
+  while (rows.next_row()) reports.push_back(_read_report(rows));
+  return reports;
 }
 
 bool DeskStore::mark_read(int64_t id) {

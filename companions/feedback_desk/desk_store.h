@@ -21,6 +21,10 @@ enum DeskStatus {
   DESK_STATUS_DECLINED = 5,
 };
 
+// What a follow-up says of the report that it names. Devices send and the store keeps these words.
+constexpr char DESK_VERDICT_STILL_HAPPENS[] = "still_happens";
+constexpr char DESK_VERDICT_WORKS_NOW[] = "works_now";
+
 struct DeskReport {
   int64_t id = 0;
   std::string device;
@@ -37,6 +41,9 @@ struct DeskReport {
   bool is_read = false;      // by staff
   std::string model_json;    // object of texts about the device
   std::string missing_json;  // list of file names that the device could not send
+  int64_t follow_up_of = 0;  // the report of the same device that this one is a follow-up to; 0: none
+  std::string verdict;       // of a follow-up, else empty
+  std::string last_verdict;  // of the newest follow-up to this report, while no answer came behind it
 };
 
 struct DeskAttachment {
@@ -72,7 +79,10 @@ class DeskStore {
   std::optional<int64_t> report_of_key(const std::string &key, const std::string &device);
   std::optional<DeskReport> report(int64_t id);
   int64_t report_count(const std::string &device);
+  // A follow-up that says "still happens" makes the report that it names unread again.
   bool complete_report(int64_t id, const std::string &missing_json);
+  // Complete follow-ups to a report, oldest first.
+  std::vector<DeskReport> follow_ups(int64_t first);
   bool mark_read(int64_t id);
   // Complete reports below the id `before` (0: from the newest), newest first; `status` 0 means any.
   std::vector<DeskReport> reports(int64_t before, int status, int limit);

@@ -15,6 +15,7 @@ constexpr size_t kShortestPhone = 16;
 constexpr int64_t kMostReportsPerDevice = 10000;
 constexpr size_t kMostMissing = 32;
 constexpr int kMostEvents = 20;
+constexpr int64_t kNoReport = -1;
 constexpr int64_t kLongestWaitSeconds = 60;
 
 // Texts about the device that are kept beside a report; everything else in "model" is dropped.
@@ -50,7 +51,20 @@ DeskReport _report_of(const Call &call, const nlohmann::json &body) {
   report.user = text_field(body, "user");
   report.created_ms = number_field(body, "created");
   report.model_json = json_line(_model_of(body));
+  // One that names no number is a follow-up all the same, and never a report of its own.
+  if (body.contains("follow_up_of")) report.follow_up_of = number_field(body, "follow_up_of", kNoReport);
+  if (report.follow_up_of) report.verdict = text_field(body, "verdict");
   return report;
+}
+
+// What is wrong with a follow-up, or null; a report that is none has nothing wrong.
+const char *_follow_up_fault(DeskStore &store, const DeskReport &report) {
+  if (report.follow_up_of == 0) return nullptr;
+  if (report.verdict != DESK_VERDICT_STILL_HAPPENS && report.verdict != DESK_VERDICT_WORKS_NOW)
+    return "verdict must be still_happens or works_now";
+  const auto first = store.report(report.follow_up_of);
+  const bool is_own = first && first->device == report.device;
+  return is_own ? nullptr : "follow_up_of names no report of this device";
 }
 
 // The report of the call's path, when it is the device's own; refuses otherwise.
@@ -128,6 +142,7 @@ void handle_add_report(Call &call) {
   auto id = store.report_of_key(key, call.device);
   if (!id && store.report_count(call.device) >= kMostReportsPerDevice)
     return refuse(call, 403, "this device has sent its 10000 reports");
+  if (const char *fault = id ? nullptr : _follow_up_fault(store, sent)) return refuse(call, 422, fault);
   if (!id) id = store.add_report(key, sent);
   const auto stored = id ? store.report(*id) : std::nullopt;
   if (!stored) return refuse(call, 503, "the desk cannot store the report");

@@ -14,6 +14,13 @@ nlohmann::json _summary(const DeskReport &report) {
           {"device", report.device}};
 }
 
+nlohmann::json _follow_ups(Desk &desk, int64_t report) {
+  nlohmann::json follow_ups = nlohmann::json::array();
+  for (const auto &follow_up : desk.store.follow_ups(report))
+    follow_ups.push_back({{"id", follow_up.id}, {"verdict", follow_up.verdict}});
+  return follow_ups;
+}
+
 nlohmann::json _files(Desk &desk, int64_t report) {
   nlohmann::json files = nlohmann::json::array();
   for (const auto &file : desk.store.attachments(report))
@@ -64,6 +71,11 @@ void handle_staff_report(Call &call) {
   body["missing"] = parse_json(report->missing_json.data(), report->missing_json.size());
   body["attachments"] = _files(call.desk, report->id);
   body["answers"] = _answers(call.desk, report->id);
+  body["follow_ups"] = _follow_ups(call.desk, report->id);
+  if (report->follow_up_of) {
+    body["follow_up_of"] = report->follow_up_of;
+    body["verdict"] = report->verdict;
+  }
   answer_json(call, 200, body);
 }
 

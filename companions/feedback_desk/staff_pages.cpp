@@ -2,6 +2,7 @@
 #include <fcntl.h>
 #include <sys/stat.h>
 
+#include "conversation_page.h"
 #include "desk.h"
 #include "json_fields.h"
 #include "page_text.h"
@@ -48,7 +49,14 @@ std::string _status_chip(int status) {
          "</span>";
 }
 
+// What staff should see first: a report that support closed and its user did not.
+std::string _attention_chip(const DeskReport &report) {
+  if (report.last_verdict != DESK_VERDICT_STILL_HAPPENS) return _status_chip(report.status);
+  return "<span class=\"status status-5\">" + verdict_text(report.last_verdict, report) + "</span>";
+}
+
 std::string _kind_text(const DeskReport &report) {
+  if (report.follow_up_of) return "Follow-up";
   return report.kind == "idea" ? "Idea" : "Problem";
 }
 
@@ -72,7 +80,7 @@ std::string _list_row(const DeskReport &report) {
          std::to_string(report.id) + "\"><span class=\"dot\"" +
          (report.is_read ? "" : " role=\"img\" aria-label=\"Unread\"") + "></span><span class=\"title\">" +
          html(_title_of(report)) + "</span><span class=\"quiet\">" + _kind_text(report) + " · " +
-         html(report.app) + " · " + html_time(report.received_ms) + "</span>" + _status_chip(report.status) +
+         html(report.app) + " · " + html_time(report.received_ms) + "</span>" + _attention_chip(report) +
          "</a></li>";
 }
 
@@ -83,52 +91,6 @@ std::string _empty_list(int status) {
   return "<section class=\"card empty\"><h2>No reports yet</h2><p class=\"quiet\">When somebody sends a "
          "problem "
          "or an idea from a phone, it appears here.</p></section>";
-}
-
-std::string _file_path(const DeskReport &report, const DeskAttachment &file) {
-  return "/staff/reports/" + std::to_string(report.id) + "/files/" + std::to_string(file.number);
-}
-
-// The first bytes of a stored file.
-std::string _file_start(const Desk &desk, int64_t report, int64_t number, int64_t most_bytes) {
-  UniqueFd file(open(desk.files.path(report, number).c_str(), O_RDONLY | O_CLOEXEC));
-  std::string start(static_cast<size_t>(most_bytes), '\0');
-  const ssize_t got = file ? read(file.get(), start.data(), start.size()) : 0;
-  start.resize(got > 0 ? static_cast<size_t>(got) : 0);
-  return start;
-}
-
-const char *_type_of(const Desk &desk, int64_t report, int64_t number) {
-  const std::string start = _file_start(desk, report, number, 16);
-  return content_type_of(start.data(), start.size());
-}
-
-// Pictures and recordings, as the user attached them.
-std::string _pictures(const Desk &desk, const DeskReport &report, const std::vector<DeskAttachment> &files) {
-  std::string body;
-  for (const auto &file : files) {
-    if (file.kind != "attachment" || !file.is_complete) continue;
-    const std::string path = _file_path(report, file), type = _type_of(desk, report.id, file.number);
-    if (type.compare(0, 6, "image/") == 0)
-      body += "<a href=\"" + path + "\"><img src=\"" + path + "\" alt=\"" + html(file.name) +
-              "\" loading=\"lazy\"></a>";
-    else if (type == "video/mp4")
-      body += "<video controls preload=\"metadata\" src=\"" + path + "\" title=\"" + html(file.name) +
-              "\"></video>";
-  }
-  return body.empty() ? body : "<div class=\"pictures\">" + body + "</div>";
-}
-
-std::string _conversation(Desk &desk, const DeskReport &report, const std::vector<DeskAttachment> &files) {
-  std::string body =
-      "<section aria-label=\"Conversation\"><div class=\"bubble theirs\"><span class=\"from\">" +
-      html(report.user.empty() ? "User" : report.user) + " · " + html_time(report.created_ms) + "</span>" +
-      html(report.text) + _pictures(desk, report, files) + "</div>";
-  for (const auto &answer : desk.store.answers(report.id))
-    body += "<div class=\"bubble ours\"><span class=\"from\">Support · " + html_time(answer.time_ms) + " · " +
-            html(status_text(answer.status)) + "</span>" +
-            (answer.reply.empty() ? "Status changed without a reply." : html(answer.reply)) + "</div>";
-  return body + "</section>";
 }
 
 std::string _answer_form(const DeskReport &report, const std::string &secret) {
@@ -166,10 +128,10 @@ std::string _other_files(const Desk &desk, const DeskReport &report,
                          const std::vector<DeskAttachment> &files) {
   std::string list;
   for (const auto &file : files) {
-    const std::string type = _type_of(desk, report.id, file.number);
+    const std::string type = file_type(desk, report.id, file.number);
     const bool is_in_conversation = file.kind == "attachment" && type != "application/octet-stream";
     if (file.is_complete && !is_in_conversation)
-      list += "<li><a href=\"" + _file_path(report, file) + "\">" + html(file.name) +
+      list += "<li><a href=\"" + file_path(report, file) + "\">" + html(file.name) +
               "</a> <span class=\"quiet\">" + html(size_text(file.size)) + "</span></li>";
   }
   const auto missing = parse_json(report.missing_json.data(), report.missing_json.size());
@@ -186,7 +148,7 @@ std::string _device_status(const Desk &desk, const DeskReport &report,
   for (const auto &file : files)
     if (file.kind == "device_status" && file.is_complete)
       body += "<section class=\"card\"><h2>Device status</h2><pre tabindex=\"0\">" +
-              html(_file_start(desk, report.id, file.number, kShownStatusFileBytes)) + "</pre></section>";
+              html(file_start(desk, report.id, file.number, kShownStatusFileBytes)) + "</pre></section>";
   return body;
 }
 
@@ -261,8 +223,9 @@ void handle_report_page(Call &call) {
   const std::string body =
       "<a class=\"back\" href=\"/staff\">‹ All reports</a><div class=\"card heading\"><div><h1>" +
       html(_title_of(*report)) + "</h1><p class=\"quiet\">" + _kind_text(*report) + " · " +
-      html(report->app) + "</p></div>" + _status_chip(report->status) + "</div><div class=\"columns\"><div>" +
-      _conversation(desk, *report, files) + _answer_form(*report, call.session->form_secret) +
+      html(report->app) + "</p>" + first_report_html(desk, *report) + "</div>" +
+      _status_chip(report->status) + "</div><div class=\"columns\"><div>" +
+      conversation_html(desk, *report, files) + _answer_form(*report, call.session->form_secret) +
       "</div><aside>" + _facts(*report) + _device_status(desk, *report, files) +
       _other_files(desk, *report, files) + "</aside></div>";
   answer_html(call, 200, html_page(_title_of(*report), call.session->form_secret, body));

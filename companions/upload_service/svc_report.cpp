@@ -61,6 +61,18 @@ std::vector<SvcFile> _files_of(const svc_voc_data &voc) {
   return files;
 }
 
+// The desk judges whether the first report is one of this phone's, and what the verdict says. False: the
+// store does not tell now.
+bool _add_follow_up(nlohmann::json &body, int voc_id) {
+  char *stored = nullptr;
+  const int first = tavro_dbmgr_get_follow_up(voc_id, &stored);
+  const TavroText verdict(stored);
+  if (first < 1) return first == 0;
+  body["follow_up_of"] = first;
+  body["verdict"] = _text(verdict.get());
+  return true;
+}
+
 }  // namespace
 
 bool svc_is_complete(int voc_id) {
@@ -83,6 +95,7 @@ std::optional<SvcReport> svc_read_report(int voc_id, const std::string &phone) {
                  {"user", _text(voc->user_name)},
                  {"created", g_ascii_strtoll(_text(voc->date_of_creation).c_str(), nullptr, 10)},
                  {"model", _model()}};
+  report.is_whole = _add_follow_up(report.body, voc_id);
   return report;
 }
 

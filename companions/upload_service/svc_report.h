@@ -25,6 +25,7 @@ struct SvcReport {
   std::string key;  // idempotency key: phone, record id and creation time, for a store may be made anew
   nlohmann::json body;
   std::vector<SvcFile> files;
+  bool is_whole = true;  // false: the store did not tell all of it, and it must not go to the desk like this
 };
 
 // Whether the client has written all of a report: its extension row, which carries a title text, comes last.

@@ -69,6 +69,11 @@ void SvcUploader::next() {
     state_.remove_requested(last_id_);
     return next();
   }
+  if (!report->is_whole) {
+    SVC_LOGE("report %d cannot be read now", last_id_);
+    has_failed_ = true;
+    return next();
+  }
   is_busy_ = true;
   tavro_dbmgr_update_voc_retry_count(last_id_, std::max(tavro_dbmgr_get_voc_retry_count(last_id_), 0) + 1);
   SvcUpload::start(desk_, std::move(*report),

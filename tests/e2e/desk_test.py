@@ -223,6 +223,33 @@ def test_what_is_too_large_or_malformed_is_refused_with_a_reason(desk):
     assert post({"kind": "idea", "text": "ü" * 200000})[0] == 201
 
 
+def test_follow_up_stays_within_its_device_and_calls_staff_back_to_the_first_report(desk):
+    first = desk.report("first")
+    desk.complete(first)
+    desk.answer(first, 3)
+    foreign = desk.register("another-phone-0123456789")["token"]
+
+    def follow_up(of, verdict, key, token=None):
+        return desk.call("POST", "/api/v1/reports", {"kind": "problem", "follow_up_of": of, "verdict": verdict},
+                         token or desk.token(), Idempotency_Key=key)
+
+    for of, verdict, token, why in [(7, "works_now", None, "names no report"), (-1, "works_now", None, "names no report"),
+                                    (str(first), "works_now", None, "names no report"), (first, "maybe", None, "verdict"),
+                                    (first, "works_now", foreign, "names no report")]:
+        status, answer, _ = follow_up(of, verdict, "refused", token)
+        assert status == 422 and why in answer["error"], (of, verdict, answer)
+    status, answer, _ = follow_up(first, "still_happens", "e")
+    assert status == 201 and follow_up(first, "still_happens", "e")[1]["id"] == answer["id"]
+    cookie = {"Cookie": desk.sign_in()}
+    page = desk.call("GET", "/staff", **cookie)[1].decode()
+    assert "Still happens" not in page and 'class="unread"' not in page, "it is not complete yet"
+    desk.complete(answer["id"])
+    page = desk.call("GET", "/staff", **cookie)[1].decode()
+    assert page.count("Still happens") == 1 and page.count('class="unread"') == 2, "the first report and the follow-up"
+    desk.answer(first, 2)
+    assert "Still happens" not in desk.call("GET", "/staff", **cookie)[1].decode()
+
+
 def test_news_arrive_while_a_device_waits_and_only_once(desk):
     report = desk.report()
     desk.complete(report)
@@ -264,8 +291,10 @@ def test_text_from_a_phone_is_only_ever_text_on_a_page(desk):
     desk.put(report, 4, b"<i>status</i>", name="s.txt", kind="device_status")
     desk.complete(report, [1, 2, 3, 4], missing=[evil])
     desk.answer(report, 2, evil)
+    second = desk.report("second", title=evil, text=evil, user=evil, follow_up_of=report, verdict="still_happens")
+    desk.complete(second)
     cookie = desk.sign_in()
-    for path in ("/staff", f"/staff/reports/{report}"):
+    for path in ("/staff", f"/staff/reports/{report}", f"/staff/reports/{second}"):
         status, page, headers = desk.call("GET", path, Cookie=cookie)
         assert status == 200 and b"&lt;script&gt;alert(1)" in page
         assert b"<script" not in page and b"<i>" not in page and b"<b>" not in page

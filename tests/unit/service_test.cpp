@@ -66,6 +66,27 @@ TEST_F(Service, LeavesTheLastAttachmentsBehindWhenThereAreMoreFilesThanTheDeskTa
   EXPECT_EQ(report["attachments"][0]["kind"], "device_status");
 }
 
+TEST_F(Service, FollowUpToAReportThatTheDeskDoesNotKnowIsRefusedAndHoldsNothingUp) {
+  const auto store_follow_up = [](int first) {
+    Problem report = problem_report("jana", "Still grey");
+    for (char **path : {&report->dump_file, &report->syslog_file, &report->device_data_filepath})
+      TAVRO_FREE(*path);
+    report->follow_up_of = first;
+    report->follow_up_verdict = TAVRO_STRDUP(TAVRO_DBMGR_STILL_HAPPENS);
+    return tavro_dbmgr_update_bug_report(report.get());
+  };
+  const int first = store_report(), to_nobody = store_follow_up(7);
+  start_service();
+  ASSERT_TRUE(wait_for_message("FAIL " + std::to_string(to_nobody)));
+  EXPECT_EQ(column("VOC_STATE", to_nobody), "0");
+  ASSERT_TRUE(wait_for_state(first, "1"));
+  const int server_id = std::stoi(column("VOC_ID_SERVER", first));
+  const int follow_up = store_follow_up(server_id);
+  launch("TAVRO_OPERATION_TYPE_UI", follow_up);
+  ASSERT_TRUE(wait_for_state(follow_up, "1"));
+  EXPECT_EQ(desk_report(follow_up)["follow_up_of"], server_id);
+}
+
 TEST_F(Service, SendsARequestedReportOnlyOnceItIsWrittenWhole) {
   const int half = store_report(), whole = store_report();
   const std::string row = " FROM TABLE_VOC_EXTENDED WHERE VOC_ID = " + std::to_string(half);
