@@ -6,9 +6,7 @@
 //   bench.screens RUNS
 #include <Elementary.h>
 #include <image_util.h>
-#include <unistd.h>
 
-#include <algorithm>
 #include <chrono>
 #include <cstdio>
 #include <cstdlib>
@@ -18,27 +16,27 @@
 #include <string>
 #include <vector>
 
-#include "main_loop.h"
 #include "tavro-common.h"
 #include "tavro-main.h"
 #include "tavro_appdata.h"
 #include "tavro_dbmgr.h"
 #include "tavro_screens.h"
 #include "tavro_thumbnails.h"
+#include "watched_loop.h"
 
 namespace {
 
 namespace fs = std::filesystem;
-using Clock = std::chrono::steady_clock;
+using watched::longest_gap;
+using watched::median;
+using watched::open_page;
+using watched::print;
+using watched::run_until_calm;
 
 constexpr int kApplications = 200;
 constexpr int kPictures = 2000;
 constexpr char kData[] = "/opt/usr/bench_data";
 constexpr char kGallery[] = "/opt/usr/media/Images";
-
-double _milliseconds(Clock::duration taken) {
-  return std::chrono::duration<double, std::milli>(taken).count();
-}
 
 // ---- What the phone holds ----
 
@@ -73,55 +71,6 @@ void _fill_gallery() {
     fs::create_hard_link(first, std::string(kGallery) + "/photo" + std::to_string(i) + ".jpg");
 }
 
-// ---- The main loop, watched ----
-
-Ecore_Select_Function _wait = nullptr;
-Clock::time_point _busy_since = Clock::now();
-Clock::time_point _painted;  // the last frame with something new
-double _longest_gap = 0;     // milliseconds between two waits for events
-
-int _watched_wait(int highest, fd_set *to_read, fd_set *to_write, fd_set *errors, timeval *timeout) {
-  _longest_gap = std::max(_longest_gap, _milliseconds(Clock::now() - _busy_since));
-  const int ready = _wait(highest, to_read, to_write, errors, timeout);
-  _busy_since = Clock::now();
-  return ready;
-}
-
-void _painted_cb(void *, Evas *, void *event_info) {
-  const auto *painted = static_cast<Evas_Event_Render_Post *>(event_info);
-  if (painted && painted->updated_area) _painted = Clock::now();
-}
-
-void _run_until_calm(std::chrono::milliseconds calm) {
-  const Clock::time_point begin = Clock::now();
-  do {
-    ecore_main_loop_iterate_may_block(0);
-    usleep(200);
-  } while (Clock::now() - std::max(_painted, begin) < calm);
-}
-
-struct waiting_times {
-  double first_frame, last_frame;
-};
-
-// From opening a page to its first frame, and to the one after which nothing more comes.
-template <typename Open>
-waiting_times _open(Open open, std::chrono::milliseconds calm) {
-  const Clock::time_point begin = Clock::now();
-  _painted = {};
-  _busy_since = begin;
-  open();
-  while (_painted < begin) ecore_main_loop_iterate_may_block(0);
-  const double first = _milliseconds(_painted - begin);
-  _run_until_calm(calm);
-  return {first, _milliseconds(_painted - begin)};
-}
-
-double _median(std::vector<double> values) {
-  std::sort(values.begin(), values.end());
-  return values[values.size() / 2];
-}
-
 long _peak_memory_kilobytes() {
   std::ifstream status("/proc/self/status");
   for (std::string line; std::getline(status, line);)
@@ -131,51 +80,45 @@ long _peak_memory_kilobytes() {
 
 // ---- The screens ----
 
-constexpr std::chrono::milliseconds kCalm(300);
-
-void _print(const char *name, double value) {
-  std::printf("%s=%.1f\n", name, value);
-}
-
 void _measure_problem_page(appdata *ad, int runs) {
   std::vector<double> page, picker, applications;
   for (int run = 0; run < runs; ++run) {
-    page.push_back(_open([ad] { tavro_create_problem_page(ad, nullptr); }, kCalm).first_frame);
-    const waiting_times times =
-        _open([ad] { tavro_create_target_picker(ad, [](appdata *, const char *, const char *) {}); }, kCalm);
+    page.push_back(open_page([ad] { tavro_create_problem_page(ad, nullptr); }).first_frame);
+    const watched::waiting_times times =
+        open_page([ad] { tavro_create_target_picker(ad, [](appdata *, const char *, const char *) {}); });
     picker.push_back(times.first_frame);
     applications.push_back(times.last_frame);
     elm_naviframe_item_pop(ad->nf);
-    _run_until_calm(kCalm);
+    run_until_calm();
     tavro_leave_compose_page(ad);
-    _run_until_calm(kCalm);
+    run_until_calm();
   }
-  _print("problem_page_ms", _median(page));
-  _print("target_picker_ms", _median(picker));
-  _print("target_picker_applications_ms", _median(applications));
-  _print("report_longest_gap_ms", _longest_gap);
+  print("problem_page_ms", median(page));
+  print("target_picker_ms", median(picker));
+  print("target_picker_applications_ms", median(applications));
+  print("report_longest_gap_ms", longest_gap);
 }
 
 void _measure_gallery(appdata *ad, int runs) {
   std::vector<double> first, cold, cached;
-  _longest_gap = 0;
+  longest_gap = 0;
   for (int run = 0; run < runs; ++run) {
     fs::remove_all(TAVRO_THUMBNAIL_FOLDER);
     fs::create_directories(TAVRO_THUMBNAIL_FOLDER);
     for (std::vector<double> *all : {&cold, &cached}) {
-      const waiting_times times =
-          _open([ad] { tavro_create_gallery_picker(ad, [](appdata *, const GSList *) {}); }, kCalm);
+      const watched::waiting_times times =
+          open_page([ad] { tavro_create_gallery_picker(ad, [](appdata *, const GSList *) {}); });
       first.push_back(times.first_frame);
       all->push_back(times.last_frame);
       elm_naviframe_item_pop(ad->nf);
-      _run_until_calm(kCalm);
+      run_until_calm();
     }
   }
-  _print("gallery_first_frame_ms", _median(first));
-  _print("gallery_first_page_cold_ms", _median(cold));
-  _print("gallery_first_page_cached_ms", _median(cached));
-  _print("gallery_longest_gap_ms", _longest_gap);
-  _print("peak_memory_mb", static_cast<double>(_peak_memory_kilobytes()) / 1024);
+  print("gallery_first_frame_ms", median(first));
+  print("gallery_first_page_cold_ms", median(cold));
+  print("gallery_first_page_cached_ms", median(cached));
+  print("gallery_longest_gap_ms", longest_gap);
+  print("peak_memory_mb", static_cast<double>(_peak_memory_kilobytes()) / 1024);
 }
 
 }  // namespace
@@ -189,19 +132,17 @@ int main(int argc, char **argv) {
   _install_applications();
   _fill_gallery();
   if (!elm_init(argc, argv)) return 1;
-  platform::merge_glib_into_ecore();
-  _wait = static_cast<Ecore_Select_Function>(ecore_main_loop_select_func_get());
-  ecore_main_loop_select_func_set(_watched_wait);
+  watched::watch_loop();
   tavro_bind_locale();
   tavro_dbmgr_init_semaphore();
   tavro_dbmgr_ensure_schema();
   appdata ad{};
   tavro_initialize_application_data(&ad);
   if (!tavro_create_base_window(&ad)) return 1;
-  evas_event_callback_add(evas_object_evas_get(ad.win), EVAS_CALLBACK_RENDER_POST, _painted_cb, nullptr);
+  watched::watch_window(ad.win);
   tavro_create_landing_page(&ad);
-  _run_until_calm(std::chrono::milliseconds(1000));
-  _longest_gap = 0;
+  run_until_calm(std::chrono::milliseconds(1000));
+  longest_gap = 0;
   _measure_problem_page(&ad, runs);
   _measure_gallery(&ad, runs);
   evas_object_del(ad.win);

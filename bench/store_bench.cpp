@@ -1,5 +1,6 @@
 // The local store beside plain SQLite doing the same work: saving a report with three attachments, and
-// loading the history from a store with 100, 10,000 and 100,000 reports. Runs in a phone of its own.
+// loading the history from a store with 100, 10,000 and 100,000 reports, and searching in it. Runs in a phone
+// of its own.
 #include <benchmark/benchmark.h>
 
 #include <cstring>
@@ -211,6 +212,32 @@ void LoadHistory_PlainSqlite(benchmark::State &state) {
     if (history.load() != 100) state.SkipWithError("not all loaded");
 }
 
+// ---- Searching ----
+
+// What no report holds, so that all of them are read to their end.
+constexpr char kNotThere[] = "gallery is FAST";
+
+void SearchReports_Store(benchmark::State &state) {
+  _use_store(static_cast<int>(state.range(0)));
+  for (auto _ : state)
+    if (tavro_dbmgr_search_vocs(kBenchUser, {kNotThere, TAVRO_VOC_STAGE_ANY, TAVRO_VOC_KIND_ANY, false}))
+      state.SkipWithError("found");
+}
+
+// SQLite's own search, which knows the case of ASCII alone, on a connection that stays open.
+void SearchReports_PlainLike(benchmark::State &state) {
+  _use_store(static_cast<int>(state.range(0)));
+  TavroDb db;
+  sqlite3_open(TAVRO_DBMGR_FILE, tavro_out(db));
+  PlainStatement search(db.get(),
+                        "SELECT VOC_ID FROM TABLE_VOC WHERE VOC_USER_NAME = ?1 AND (VOC_TEXT LIKE ?2 OR "
+                        "VOC_PUSH_COMMENTS LIKE ?2 OR EXISTS (SELECT 1 FROM TABLE_VOC_EXTENDED WHERE "
+                        "TABLE_VOC_EXTENDED.VOC_ID = TABLE_VOC.VOC_ID AND VOC_TITLE_TEXT LIKE ?2)) "
+                        "ORDER BY VOC_DATE_OF_UPDATION DESC LIMIT 100");
+  const std::string pattern = std::string("%") + kNotThere + "%";
+  for (auto _ : state) search.run({kBenchUser, pattern.c_str()});
+}
+
 BENCHMARK(SaveReport_Store)->Unit(benchmark::kMillisecond)->UseRealTime();
 BENCHMARK(SaveReport_PlainSqlite)->Unit(benchmark::kMillisecond)->UseRealTime();
 BENCHMARK(LoadHistory_Store)->Arg(100)->Arg(10000)->Arg(100000)->Unit(benchmark::kMillisecond)->UseRealTime();
@@ -220,6 +247,8 @@ BENCHMARK(LoadHistory_PlainSqlite)
     ->Arg(100000)
     ->Unit(benchmark::kMillisecond)
     ->UseRealTime();
+BENCHMARK(SearchReports_Store)->Arg(10000)->Unit(benchmark::kMillisecond)->UseRealTime();
+BENCHMARK(SearchReports_PlainLike)->Arg(10000)->Unit(benchmark::kMillisecond)->UseRealTime();
 
 }  // namespace
 

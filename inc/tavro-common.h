@@ -38,6 +38,19 @@ struct tavro_popup_button {
 Evas_Object *tavro_popup_show(appdata *ad, Evas_Object **slot, const char *title, const char *body,
                               std::initializer_list<tavro_popup_button> buttons);
 
+// A question that wants more weight: a picture file or (`picture` null) a tile beside its title and the line
+// under that, and a main button as wide as the card over the others (`main.text` null: none). Otherwise as a
+// popup.
+struct tavro_card {
+  const char *tile;
+  const char *picture;
+  const char *title, *subtitle, *body;
+  tavro_popup_button main;
+};
+Evas_Object *tavro_card_show(appdata *ad, Evas_Object **slot, const tavro_card &card,
+                             const std::vector<tavro_popup_button> &others);
+void tavro_card_subtitle_set(Evas_Object *popup, const char *subtitle);
+
 // A menu below the end of the title bar; a touch beside it closes it. Otherwise as a popup.
 Evas_Object *tavro_menu_show(appdata *ad, Evas_Object **slot,
                              std::initializer_list<tavro_popup_button> entries);
@@ -45,6 +58,9 @@ Evas_Object *tavro_menu_show(appdata *ad, Evas_Object **slot,
 // The same at the foot of the window, under a title.
 Evas_Object *tavro_sheet_show(appdata *ad, Evas_Object **slot, const char *title,
                               const std::vector<tavro_popup_button> &entries);
+
+// A popup that is shown, other than those about a crash; null when there is none.
+Evas_Object *tavro_popup_shown(const appdata *ad);
 
 // Close every popup that is shown.
 void tavro_delete_all_popup(appdata *ad);

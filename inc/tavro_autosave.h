@@ -13,7 +13,8 @@ void tavro_autosave_start(appdata *ad, tavro_end_unchanged end_unchanged);
 void tavro_autosave_stop();
 
 // The application ends and nobody can be asked: what would be lost of an open compose screen becomes a draft.
-void tavro_autosave_at_end(appdata *ad);
+// False when there was nothing to lose, or the store refused it: then the keeper's file goes on keeping it.
+bool tavro_autosave_at_end(appdata *ad);
 
 // The platform's report of a new battery capacity; `value` carries the percentage, `user_data` is the
 // appdata.

@@ -15,6 +15,9 @@ struct appdata;
 // The open compose screen is the one to be kept from now on. Closes a question that came up before it.
 void tavro_compose_keeper_start(appdata *ad);
 
+// Nothing of what the open screen showed when it came up is stored anywhere: all of it is to be kept.
+void tavro_compose_keeper_keep_all();
+
 // Something changed: it is written within two seconds, and at most once in two seconds.
 void tavro_compose_keeper_note();
 

@@ -14,8 +14,10 @@ struct compose_view_win;
 void tavro_compose_strip_build(appdata *ad, compose_view_win *view, Evas_Object *box);
 // Build the row of the crash dump, when the screen holds one.
 void tavro_compose_dump_build(appdata *ad, Evas_Object *box);
-// Take the dump off the open screen.
+// Take the dump off the open screen, and off the phone unless a stored report needs it.
 void tavro_compose_dump_remove(appdata *ad);
+// Show what the open screen's dump holds.
+void tavro_compose_dump_open(appdata *ad);
 
 // Show the open screen's attachments, dump and size as they are now.
 void tavro_compose_strip_refresh(appdata *ad);

@@ -9,3 +9,7 @@ struct appdata;
 // "CRASH_PROCESS" of the crash service. A client that was started for a crash that it does not ask about ends
 // itself.
 void tavro_handle_crash_event(app_control_h service, appdata *ad);
+
+// The application ends, its window has gone: whatever is being collected is given up, and a dump that no
+// screen took goes.
+void tavro_crash_report_at_end();

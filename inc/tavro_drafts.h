@@ -37,7 +37,7 @@ struct compose_view_win {
 // The problem report screen.
 struct problem_view_win : compose_view_win {
   Evas_Object *collectBtn;  // shown while a log can be collected
-  Evas_Object *dump_row;    // crash dump of the report; null without one
+  Evas_Object *dump_row;    // crash dump of the report, or why it has none; null when there is nothing to say
   char *dump_filename;
   char *dump_filepath;
   char *syslog_filename;
@@ -57,6 +57,10 @@ constexpr size_t kGeneratedFilenameSize = 4096;
 // (1 or more), a value below 1 when storing failed, 0 when no such screen is open.
 int tavro_save_problem_compose_data(appdata *ad, int status);
 int tavro_save_idea_compose_data(appdata *ad, int status);
+
+// Store a problem report that no screen holds and have it sent, with the sending notification. The record
+// stays the caller's. Returns its id; below 1: nothing was stored and nothing is sent.
+int tavro_send_report(appdata *ad, tavro_dbmgr_bug_report_info *report);
 
 // The Done action and the "save as draft" entry, from either compose screen: save, and when the new record is
 // stored remove the draft that the screen was opened from and an automatically saved copy, so that neither a

@@ -22,6 +22,10 @@ void tavro_focus_leave_page(Evas_Object *naviframe);
 // Let the focus go round among widgets, of which there is at least one, and never leave them.
 void tavro_focus_keep_among(const std::vector<Evas_Object *> &widgets);
 
+// Let the up and down keys lead through all items of a list. Of itself the toolkit stops at what is on the
+// screen.
+void tavro_focus_walk_list(Evas_Object *list);
+
 // Show or hide the ring in the window of `widget`. The toolkit shows it by itself at the keys that it moves
 // the focus with, and hides it at a touch; who moves the focus at a key of a widget's own shows it too.
 void tavro_focus_show(Evas_Object *widget);

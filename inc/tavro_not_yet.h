@@ -23,8 +23,7 @@ void tavro_load_url(appdata *ad, int in_background);
 void tavro_create_account_page_ui(appdata *ad, GSList *accounts);
 int tavro_add_account_result(appdata *ad);
 
-// Beta centre, banners and log-out.
+// Beta centre and banners.
 Evas_Object *tavro_beta_details_optin_button(appdata *ad);  // null when the details page is not shown
 void tavro_refresh_beta_pages(appdata *ad, const char *what);
 void tavro_refresh_banners(appdata *ad);
-void tavro_sign_out(appdata *ad);

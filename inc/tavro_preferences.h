@@ -22,6 +22,9 @@ constexpr char TAVRO_PREF_QUALITY[] = "tavro_quality";                          
 constexpr char TAVRO_PREF_PREFERENCE[] = "tavro_preference";                          // int: first run
 constexpr char TAVRO_PREF_NEW_WELCOME_PREFERENCE[] = "tavro_new_welcome_preference";  // int
 constexpr char TAVRO_PREF_SENT_PAGE_SEEN[] = "tavro_sent_page_seen";  // boolean: "What is sent" was shown
+// Crashes: the ids of applications that are never asked about, one a line, and when which crashed last.
+constexpr char TAVRO_PREF_CRASH_NEVER[] = "tavro_crash_never";
+constexpr char TAVRO_PREF_CRASH_TIMES[] = "tavro_crash_times";
 constexpr char TAVRO_PREF_UPDATE[] = "tavro_update";  // string: "updated" once a minor update was offered
 
 // The account; all but the maker's user name are removed at log-out.
@@ -76,3 +79,7 @@ bool tavro_preference_flag(const char *key, bool fallback);
 
 // The signed-in account's user name; null before an account was chosen.
 TavroText tavro_get_username_from_preference();
+
+// Whether the person who is signed in may see what is stored for this user: it is their own, or, with a null
+// or empty name, nobody's.
+bool tavro_is_for_signed_in_user(const char *user_name);

@@ -9,8 +9,9 @@ struct appdata;
 void tavro_prepare_store();
 
 // Complete the save that a process left unfinished, and have the report sent if it was being sent. Also
-// before each save, since there is one note only.
-void tavro_finish_interrupted_save();
+// before each save, since there is one note only. The report's id; below 1 when there was none, or it cannot
+// be completed yet.
+int tavro_finish_interrupted_save();
 
 // Tell the person that the stored reports could not be read and were set aside. Once, and only when it
 // happened and a window is there.

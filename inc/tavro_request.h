@@ -16,3 +16,6 @@ std::vector<std::string> tavro_request_texts(app_control_h request, const char *
 
 // A record id written as decimal text: 1 or more; 0 for null and for anything else.
 int tavro_record_id_from_text(const char *text);
+
+// An id that the server gave, the same way.
+long tavro_server_id_from_text(const char *text);

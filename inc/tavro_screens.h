@@ -15,6 +15,8 @@ void tavro_update_landing_page_history_badge(appdata *ad);
 
 // Welcome and account choice, shown until an account is stored in "tavro_username".
 void tavro_create_account_page(appdata *ad);
+// Say something on it in place of its greeting, plain text; nothing when the page is not open.
+void tavro_account_page_say(appdata *ad, const char *text);
 // Read the phone's accounts anew; nothing when the page is not open.
 void tavro_refresh_account_page_items(appdata *ad);
 
@@ -31,6 +33,15 @@ void tavro_compose_keeper_offer(appdata *ad);
 void tavro_create_problem_page(appdata *ad, const svc_voc_data *draft);
 void tavro_create_idea_page(appdata *ad, const svc_voc_data *draft);
 
+// A new problem report about an application that crashed. Asks for the system log.
+struct tavro_crash_report {
+  const char *app_name;
+  const char *app_icon;  // path, may be null
+  const char *archive;   // of the dump; null: none was found or, when it has_failed, collecting failed
+  bool has_failed;
+};
+void tavro_create_crash_page(appdata *ad, const tavro_crash_report &report);
+
 // Pickers, which report once through their callback and pop themselves.
 // `name` is an application's name or the string id of a fixed category; `icon` a path, may be null.
 using tavro_target_chosen = void (*)(appdata *ad, const char *name, const char *icon);
@@ -46,8 +57,10 @@ using tavro_review_send = void (*)(appdata *ad);
 void tavro_create_review_page(appdata *ad, tavro_review_send send);
 
 // One picture or video of the phone, as large as the screen. One plain text, scrolled, in parts when it is
-// long; a log keeps its columns. All arguments are copied.
-void tavro_create_picture_page(appdata *ad, const char *path);
+// long; a log keeps its columns. The end of a system log, from the archive it lies in; a popup says so when
+// it cannot be read. All arguments are copied. `can_save` offers a copy among the phone's pictures.
+void tavro_create_picture_page(appdata *ad, const char *path, bool can_save = false);
+void tavro_create_log_page(appdata *ad, const char *title, const char *path);
 void tavro_create_text_page(appdata *ad, const char *title, const char *text, bool is_log = false);
 
 // History list "My Reports", and its refresh after a message of the upload service (does nothing when the

@@ -31,9 +31,10 @@ void _tavro_launch_upload_mgr_svc(const char *operation, int value);
 // Tell the service that the person touched an item of the beta pages: kind "general" or "banner".
 void _tavro_send_beta_click_event_to_svc(const char *item_kind, long item_id);
 
-// Open a page of the application store, or a page in the phone's browser.
-void _tavro_launch_app_store(const char *uri);
-void tavro_launch_browser(const char *uri);
+// Open a page of the application store, or a page in the phone's browser. False when the phone has none that
+// would take it: the caller tells the person.
+bool _tavro_launch_app_store(const char *uri);
+bool tavro_launch_browser(const char *uri);
 
 // Send a one-way message on the system bus. `signature` is "(iss)" for the method "dump_log" and "(is)" for
 // any other, or null for a message without a body; `parameters` holds its values as text, a number in

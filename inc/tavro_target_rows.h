@@ -23,6 +23,9 @@ tavro_target_row tavro_target_row_of(const tavro_target_category &category);
 std::vector<const tavro_target_row *> tavro_target_rows_matching(const std::vector<tavro_target_row> &rows,
                                                                  const std::string &key);
 
+// An application's picture; the tile of an application where it cannot be read, since it is another's file.
+Evas_Object *tavro_application_icon_add(Evas_Object *parent, const char *path);
+
 // An empty list, and the class of its rows: an item's data is a row, which must outlive the item. The caller
 // frees the class.
 Evas_Object *tavro_target_list_add(Evas_Object *parent);

@@ -19,7 +19,10 @@ int check_version_update(appdata *ad);
 // Offer the update: kind "MAJOR" (update or leave) or "MINOR" (update or later).
 void tavro_create_version_update_popup(appdata *ad, const char *kind);
 
-// Whether the popup is shown or waits for a window; and show one that waits, with a window of its own if need
-// be.
+// Whether the popup is shown or waits for a window; and show one that waits, over the first page if there is
+// no window yet.
 bool tavro_version_popup_is_up(const appdata *ad);
 void tavro_show_due_version_popup(appdata *ad);
+
+// The client ends: an offer that still waits was never seen, so the next start makes it again.
+void tavro_forget_due_version_popup();

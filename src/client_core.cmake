@@ -7,11 +7,18 @@ set(TAVRO_CLIENT_CORE
   tavro_compose_keeper.cpp
   tavro_compose_kept.cpp
   tavro_compose_state.cpp
+  tavro_crash_archive.cpp
+  tavro_crash_collect.cpp
+  tavro_crash_memory.cpp
+  tavro_crash_rules.cpp
   tavro_crash_service.cpp
+  tavro_deleted_files.cpp
   tavro_device_status.cpp
   tavro_drafts.cpp
   tavro_drafts_actions.cpp
   tavro_drafts_records.cpp
+  tavro_follow_up.cpp
+  tavro_follow_up_kept.cpp
   tavro_history_text.cpp
   tavro_lifecycle.cpp
   tavro_log_archive.cpp
@@ -26,8 +33,10 @@ set(TAVRO_CLIENT_CORE
   tavro_request.cpp
   tavro_resend.cpp
   tavro_resume.cpp
+  tavro_save_copy.cpp
   tavro_service_bridge.cpp
   tavro_service_events.cpp
+  tavro_sign_out.cpp
   tavro_start.cpp
   tavro_system_log.cpp
   tavro_version_check.cpp)

@@ -6,6 +6,7 @@ set(TAVRO_CLIENT_UI
   tavro_widgets.cpp
   tavro-common.cpp
   tavro_popup.cpp
+  tavro_undo_bar.cpp
   tavro_targets.cpp
   tavro_performance_page.cpp
   tavro_target_rows.cpp
@@ -18,6 +19,7 @@ set(TAVRO_CLIENT_UI
   tavro_thumbnails.cpp
   tavro_details_text.cpp
   tavro_compose_attach.cpp
+  tavro_compose_dump.cpp
   tavro_compose_end.cpp
   tavro_compose_log.cpp
   tavro_compose_send.cpp
@@ -34,6 +36,18 @@ set(TAVRO_CLIENT_UI
   tavro_landing.cpp
   tavro_account_page.cpp
   tavro_history.cpp
+  tavro_history_end.cpp
+  tavro_history_filter.cpp
+  tavro_history_nothing.cpp
+  tavro_history_refresh.cpp
+  tavro_history_rows.cpp
+  tavro_history_select.cpp
   tavro_history_details.cpp
+  tavro_history_details_actions.cpp
+  tavro_history_details_build.cpp
+  tavro_history_details_files.cpp
+  tavro_history_details_reply.cpp
+  tavro_crash_occupation.cpp
+  tavro_crash_popup.cpp
   tavro_crash_report.cpp
   tavro_share.cpp)

@@ -187,6 +187,12 @@ void tavro_refresh_account_page_items(appdata *) {
   _show_rows(view);
 }
 
+void tavro_account_page_say(appdata *ad, const char *text) {
+  if (!ad->account_layout) return;
+  tavro_layout_text_set(ad->account_layout, "elm.text.sub", text);
+  elm_atspi_accessible_name_set(ad->account_layout, text);
+}
+
 void tavro_create_account_page(appdata *ad) {
   if (!ad->nf || ad->account_layout) return;
   account_page *view = _open_page = TAVRO_ZALLOC(account_page);

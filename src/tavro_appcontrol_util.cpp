@@ -6,6 +6,7 @@
 #include "tavro-main.h"
 #include "tavro_appdata.h"
 #include "tavro_crash_report.h"
+#include "tavro_launch_tables.h"
 #include "tavro_log.h"
 #include "tavro_memory.h"
 #include "tavro_not_yet.h"
@@ -168,4 +169,10 @@ void app_control(app_control_h request, void *user_data) {
     if (run) run(request, ad);
   }
   _show_due_popups(ad);
+}
+
+std::vector<tavro_accepted_operation> tavro_accepted_operations() {
+  std::vector<tavro_accepted_operation> all;
+  for (const operation_row &row : kRows) all.push_back({row.operation, row.log_line});
+  return all;
 }

@@ -54,11 +54,11 @@ void tavro_autosave_stop() {
   device_remove_callback(DEVICE_CALLBACK_BATTERY_CAPACITY, __tavro_app_battery_capacity_changed_cb);
 }
 
-void tavro_autosave_at_end(appdata *ad) {
+bool tavro_autosave_at_end(appdata *ad) {
   const compose_view_win *view = tavro_compose_view(ad);
-  if (!view) return;
+  if (!view) return false;
   const bool has_nothing = _end_unchanged ? _end_unchanged(ad) : !_has_something_to_save(ad, view);
-  if (!has_nothing) tavro_save_compose_draft(ad);
+  return !has_nothing && tavro_save_compose_draft(ad) >= 1;
 }
 
 void __tavro_app_battery_capacity_changed_cb(device_callback_e type, void *value, void *user_data) {

@@ -34,13 +34,16 @@ void _show_target(compose_view_win *view, bool is_idea) {
   elm_object_part_content_set(view->target_button, "elm.swallow.content", icon);
 }
 
-// Writing comes next. The naviframe gives the focus of a page that comes up to its first button, where a
-// blank would close the page.
+// Writing comes next; a crash report has its title already. The naviframe gives the focus of a page that
+// comes up to its first button, where a blank would close the page.
 void _focus_title_cb(void *data, Evas_Object *nf, void *) {
-  const compose_view_win *view = tavro_compose_view(static_cast<appdata *>(data));
+  appdata *ad = static_cast<appdata *>(data);
+  const compose_view_win *view = tavro_compose_view(ad);
   evas_object_smart_callback_del(nf, "transition,finished", _focus_title_cb);
-  if (view && elm_naviframe_top_item_get(nf) == view->nf_it)
-    elm_object_focus_set(view->title_entry, EINA_TRUE);
+  if (!view || elm_naviframe_top_item_get(nf) != view->nf_it) return;
+  Evas_Object *entry = ad->type == CRASH ? view->entry : view->title_entry;
+  elm_object_focus_set(entry, EINA_TRUE);
+  elm_entry_cursor_end_set(entry);  // A draft's text is gone on with.
 }
 
 void _target_chosen(appdata *ad, const char *name, const char *icon) {
@@ -103,6 +106,7 @@ void _build_target(appdata *ad, compose_view_win *view, Evas_Object *box) {
 void _fill_from_draft(compose_view_win *view, const svc_voc_data *draft) {
   elm_entry_entry_set(view->entry, tavro_markup(draft->description).c_str());
   elm_entry_entry_set(view->title_entry, tavro_markup(draft->title_description).c_str());
+  elm_entry_cursor_end_set(view->entry);
   for (const GSList *link = draft->attachments; link; link = link->next) {
     const char *path = static_cast<const tavro_dbmgr_attachment_info *>(link->data)->file_path;
     if (!path) continue;  // of a damaged record
@@ -187,8 +191,10 @@ void tavro_create_problem_page(appdata *ad, const svc_voc_data *draft) {
   ad->type = draft && ad->type == CRASH ? CRASH : PROBLEM;
   ad->problem_view = TAVRO_ZALLOC(problem_view_win);
   if (draft) _take_files(ad->problem_view, draft);
-  _build_page(ad, ad->problem_view, draft, tavro_text("IDS_OB_HEADER_REPORT_A_PROBLEM"),
-              tavro_text("IDS_OB_BODY_PROBLEM_HINT"));
+  const bool is_crash = ad->type == CRASH;
+  _build_page(ad, ad->problem_view, draft,
+              tavro_text(is_crash ? "IDS_OB_HEADER_REPORT_A_CRASH" : "IDS_OB_HEADER_REPORT_A_PROBLEM"),
+              tavro_text(is_crash ? "IDS_OB_BODY_CRASH_HINT" : "IDS_OB_BODY_PROBLEM_HINT"));
 }
 
 void tavro_create_idea_page(appdata *ad, const svc_voc_data *draft) {

@@ -7,6 +7,7 @@
 #include "tavro_compose.h"
 #include "tavro_compose_keeper.h"
 #include "tavro_compose_parts.h"
+#include "tavro_crash_archive.h"
 #include "tavro_dbmgr.h"
 #include "tavro_report_files.h"
 #include "tavro_screens.h"
@@ -49,6 +50,8 @@ void _end_parts(appdata *ad) {
 // The screen ends without a new record: its automatic copy goes with it, and so does, when the person says
 // "discard", the draft that it was opened from with its log.
 void _end_without_record(appdata *ad, bool with_draft) {
+  const bool has_dump = ad->problem_view && ad->problem_view->dump_filepath;
+  const std::string dump = has_dump ? ad->problem_view->dump_filepath : "";
   tavro_compose_log_end();
   tavro_system_log_drop(ad);  // while the draft is known: its log stays its own
   tavro_system_log_end(ad);
@@ -61,6 +64,7 @@ void _end_without_record(appdata *ad, bool with_draft) {
   ad->id_to_delete = 0;
   tavro_autosave_stop();
   tavro_compose_keeper_forget();
+  if (has_dump) tavro_crash_archive_delete_unneeded(dump);
   _end_parts(ad);
 }
 

@@ -2,11 +2,13 @@
 
 #include <Elementary.h>
 #include <notification.h>
+#include <unistd.h>
 
 #include <algorithm>
 #include <cerrno>
 #include <cstring>
 #include <ctime>
+#include <set>
 #include <string>
 
 #include "tavro-common.h"
@@ -80,6 +82,25 @@ std::string _said(const kept_writing &kept) {
   return said;
 }
 
+void _add_file(const char *path, std::set<std::string> *paths) {
+  if (path && *path) paths->insert(path);
+}
+
+void _add_files_of(const svc_voc_data &content, std::set<std::string> *paths) {
+  for (const GSList *link = content.attachments; link; link = link->next)
+    _add_file(static_cast<const tavro_dbmgr_attachment_info *>(link->data)->file_path, paths);
+  for (const char *path : {content.dump_file, content.syslog_file}) _add_file(path, paths);
+}
+
+void _add_files_on_screen(std::set<std::string> *paths) {
+  const compose_view_win *view = _open_view();
+  for (const GSList *link = view ? view->attachments : nullptr; link; link = link->next)
+    _add_file(static_cast<const char *>(link->data), paths);
+  const problem_view_win *problem = view ? _screen.ad->problem_view : nullptr;
+  if (!problem) return;
+  for (const char *path : {problem->dump_filepath, problem->syslog_filepath}) _add_file(path, paths);
+}
+
 void _remove_file() {
   if (!_screen.path.empty()) tavro_kept_remove(_screen.path);
   _screen.path.clear();
@@ -150,10 +171,28 @@ void tavro_compose_keeper_start(appdata *ad) {
     evas_object_event_callback_add(view->layout, EVAS_CALLBACK_DEL, _page_deleted_cb, nullptr);
 }
 
+std::optional<std::set<std::string>> tavro_kept_attached_files() {
+  std::set<std::string> paths;
+  _add_files_on_screen(&paths);
+  for (const std::string &path : tavro_kept_paths()) {
+    const std::optional<kept_writing> kept = tavro_kept_load(path);
+    if (kept)
+      _add_files_of(*kept->content, &paths);
+    else if (access(path.c_str(), F_OK) == 0)  // else it was set aside
+      return std::nullopt;
+  }
+  return paths;
+}
+
 void tavro_compose_keeper_take_over(const std::string &path) {
   if (!_screen.ad) return;
   _screen.path = path;
   _screen.opened.clear();
+}
+
+void tavro_compose_keeper_keep_all() {
+  _screen.opened.clear();
+  tavro_compose_keeper_note();
 }
 
 void tavro_compose_keeper_note() {

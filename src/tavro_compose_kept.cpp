@@ -105,6 +105,7 @@ bool _is_same_report(const kept_writing &kept, const svc_voc_data &stored) {
          created >= kept.begun * kMillisecondsPerSecond && _are_equal(stored.type, _stored_type(kept.type)) &&
          _are_equal(stored.description, content.description) &&
          _are_equal(stored.title_description, content.title_description) &&
+         _are_equal(stored.dump_file, content.dump_file) &&
          _have_same_files(stored.attachments, content.attachments);
 }
 

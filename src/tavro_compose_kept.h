@@ -4,6 +4,7 @@
 #pragma once
 
 #include <optional>
+#include <set>
 #include <string>
 #include <vector>
 
@@ -34,6 +35,10 @@ void tavro_kept_remove(const std::string &path);
 std::vector<std::string> tavro_kept_paths();
 // A path for one more; empty when there are too many.
 std::string tavro_kept_unused_path();
+
+// Paths of the attachments, logs and dumps that the kept files and the open screen name: none of them may go.
+// Nothing when one of the kept files cannot be read now.
+std::optional<std::set<std::string>> tavro_kept_attached_files();
 
 // What a person wrote or attached. A log that came by itself, or a target alone, is no loss.
 bool tavro_kept_says_something(const kept_writing &kept);

@@ -117,6 +117,10 @@ void tavro_compose_log_build(appdata *ad, problem_view_win *view, Evas_Object *b
   evas_object_event_callback_add(row, EVAS_CALLBACK_DEL, _row_deleted_cb, _first_update);
 }
 
+void tavro_compose_log_want(appdata *ad) {
+  if (ad->problem_view && ad->problem_view->log_row) _is_wanted = true;
+}
+
 void tavro_compose_log_update(appdata *ad) {
   if (!ad->problem_view || !ad->problem_view->log_row) return;
   const tavro_system_log_state state = _state(ad);

@@ -49,7 +49,7 @@ std::string _first_line(const char *text) {
   return line.substr(0, line.find('\n'));
 }
 
-// Its first words; the name of a file where there are none.
+// Its first words; the name of a file, or of what crashed, where there are none.
 std::string _first_words(const kept_writing &kept) {
   const svc_voc_data &content = *kept.content;
   std::string words = _first_line(content.title_description);
@@ -57,6 +57,7 @@ std::string _first_words(const kept_writing &kept) {
   if (words.empty() && content.attachments)
     words = tavro_file_name(
         static_cast<const tavro_dbmgr_attachment_info *>(content.attachments->data)->file_path);
+  if (words.empty() && content.app_name) words = content.app_name;
   if (g_utf8_strlen(words.c_str(), -1) <= kShownCharacters) return words;
   return words.substr(0, static_cast<size_t>(g_utf8_offset_to_pointer(words.c_str(), kShownCharacters) -
                                              words.c_str())) +

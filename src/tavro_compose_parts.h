@@ -49,6 +49,8 @@ bool tavro_compose_tell_lost_files(appdata *ad, std::initializer_list<tavro_popu
 // Build the log's row into the box. A screen that was opened with a log wants to keep it; otherwise the
 // person's setting says whether a log is wanted.
 void tavro_compose_log_build(appdata *ad, problem_view_win *view, Evas_Object *box);
+// The person's report wants a log, whatever the setting says.
+void tavro_compose_log_want(appdata *ad);
 // Collect a log that is wanted or that the target asks for, drop one that is neither, and show how it stands.
 void tavro_compose_log_update(appdata *ad);
 // What was put off until the screen was painted is done now.
@@ -59,6 +61,12 @@ void tavro_compose_log_give_up(appdata *ad);
 bool tavro_compose_log_was_switched();
 // The screen ends.
 void tavro_compose_log_end();
+
+// ---- The crash dump (tavro_compose_dump.cpp) ----
+
+// Ask what to do about a dump that puts the report above the limit; `go_on` is called once the person has
+// left it out. False when there is nothing to ask, also where leaving it out would not be enough.
+bool tavro_compose_dump_is_too_large(appdata *ad, void (*go_on)(appdata *ad));
 
 enum class log_stand {
   settled,  // there, or not asked for

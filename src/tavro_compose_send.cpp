@@ -132,7 +132,7 @@ void _begin(appdata *ad) {
   compose_view_win *view = tavro_compose_view(ad);
   if (!view) return;
   tavro_compose_count(view);
-  if (!_is_complete(ad) || !_has_all_files(ad)) return;
+  if (tavro_compose_dump_is_too_large(ad, _begin) || !_is_complete(ad) || !_has_all_files(ad)) return;
   tavro_compose_log_hurry(ad);
   _check_log(ad);
 }

@@ -131,14 +131,6 @@ Evas_Object *_build_attachment(appdata *ad, Evas_Object *strip, const char *path
   return frame;
 }
 
-void _set_row_text(Evas_Object *row, const char *path) {
-  const gint64 size = tavro_attachment_size(path);
-  const std::string text =
-      tavro_file_name(path) + " \u00B7 " +
-      (size < 0 ? std::string(tavro_text("IDS_OB_BODY_FILE_UNREADABLE")) : tavro_size_text(size));
-  tavro_layout_text_set(row, "elm.text.sub", text.c_str());
-}
-
 // What asked for the removal goes with the rebuilt strip, but not from inside its own callback.
 void _removed_cb(void *data) {
   appdata *ad = static_cast<appdata *>(data);
@@ -147,20 +139,6 @@ void _removed_cb(void *data) {
   tavro_compose_strip_refresh(ad);
   tavro_compose_strip_focus(ad,
                             static_cast<const char *>(g_slist_nth_data(view->attachments, _place_to_focus)));
-}
-
-// ---- The crash dump ----
-
-void _dump_removed_cb(void *data, Evas_Object *, void *) {
-  // Not from inside the button's own callback.
-  ecore_job_add([](void *ad) { tavro_compose_dump_remove(static_cast<appdata *>(ad)); }, data);
-}
-
-void _refresh_dump(appdata *ad) {
-  problem_view_win *view = ad->problem_view;
-  if (!view || !view->dump_row || view->dump_filepath) return;
-  evas_object_del(view->dump_row);
-  view->dump_row = nullptr;
 }
 
 }  // namespace
@@ -189,29 +167,6 @@ void tavro_compose_strip_build(appdata *, compose_view_win *view, Evas_Object *b
   elm_box_pack_end(box, group);
 }
 
-void tavro_compose_dump_build(appdata *ad, Evas_Object *box) {
-  problem_view_win *view = ad->problem_view;
-  if (!view || !view->dump_filepath) return;
-  Evas_Object *row = view->dump_row = tavro_layout_add(box, "tavro/compose/file");
-  tavro_fill_width(row);
-  elm_object_part_content_set(row, "elm.swallow.icon", tavro_icon_add(row, "file"));
-  tavro_layout_text_set(row, "elm.text", tavro_text("IDS_OB_BODY_CRASH_DUMP"));
-  _set_row_text(row, view->dump_filepath);
-  const std::string name =
-      std::string(tavro_text("IDS_OB_BUTTON_REMOVE")) + " " + tavro_text("IDS_OB_BODY_CRASH_DUMP");
-  Evas_Object *remove = tavro_button_add(row, "tavro_icon", nullptr, tavro_icon_add(row, "close"),
-                                         name.c_str(), _dump_removed_cb, ad);
-  elm_object_part_content_set(row, "elm.swallow.end", remove);
-  elm_box_pack_end(box, row);
-}
-
-void tavro_compose_dump_remove(appdata *ad) {
-  if (!ad->problem_view) return;
-  TAVRO_FREE(ad->problem_view->dump_filename);
-  TAVRO_FREE(ad->problem_view->dump_filepath);
-  tavro_compose_strip_refresh(ad);
-}
-
 void tavro_compose_strip_refresh(appdata *ad) {
   compose_view_win *view = tavro_compose_view(ad);
   if (!view) return;
@@ -223,7 +178,6 @@ void tavro_compose_strip_refresh(appdata *ad) {
       frame, tavro_button_add(frame, "tavro_attach", nullptr, tavro_icon_add(frame, "plus"),
                               tavro_text("IDS_OB_BUTTON_ATTACH_PICTURES"), _attach_clicked_cb, ad));
   elm_box_pack_end(view->strip, frame);
-  _refresh_dump(ad);
   tavro_compose_size_refresh(ad);
   tavro_compose_keeper_note();
 }

@@ -10,6 +10,8 @@
 
 #include "tavro-common.h"
 #include "tavro-main.h"
+#include "tavro_compose.h"
+#include "tavro_compose_keeper.h"
 #include "tavro_dbmgr.h"
 #include "tavro_drafts_save.h"
 #include "tavro_handles.h"
@@ -38,6 +40,25 @@ void _copy_entry(const Evas_Object *entry, char *&text) {
   text = TAVRO_ADOPT(plain);
 }
 
+// The screen that is open has an automatic copy which could be noted only. The note protects it until the
+// screen is saved again.
+bool open_screen_is_noted = false;
+
+void _give_up_note() {
+  if (std::exchange(open_screen_is_noted, false)) tavro_journal_abandon();
+}
+
+// For another report, while the screen stays: its note becomes its automatic copy. While the store refuses
+// that, no other report can be noted, and none is stored.
+void _store_note(appdata *ad) {
+  const int id = open_screen_is_noted ? tavro_finish_interrupted_save() : 0;
+  if (id < 1) return;
+  open_screen_is_noted = false;
+  const int earlier_id = std::exchange(ad->auto_saved_id, id);
+  if (earlier_id >= 1) tavro_dbmgr_destroy_vocs_by_id(earlier_id);
+  tavro_compose_keeper_note();
+}
+
 void _begin_save(appdata *ad, compose_view_win *view, int status) {
   if (view->menu_popup) {
     evas_object_del(view->menu_popup);
@@ -49,6 +70,7 @@ void _begin_save(appdata *ad, compose_view_win *view, int status) {
   if (status == TAVRO_STATUS_SENDING) {
     tavro_create_notification(tavro_text("IDS_OB_TPOP_SENDING_FEEDBACK_ING_ABB"), view->description, ad);
   }
+  _give_up_note();
 }
 
 template <typename Record>
@@ -99,10 +121,6 @@ Suggestion _make_suggestion(const appdata *ad, const char *user_name, int status
   return suggestion;
 }
 
-// The screen that is open has an automatic copy which could be noted only. The note protects it until the
-// screen is saved again.
-bool open_screen_is_noted = false;
-
 // The device status file was made for this report alone.
 void _discard_files(const tavro_dbmgr_bug_report_info *report) {
   const char *path = report->device_data_filepath;
@@ -115,7 +133,6 @@ void _discard_files(const tavro_dbmgr_suggestion_info *) {}
 // The id of the report when all of it was stored, else below 1.
 template <typename Report>
 int _store(const appdata *ad, Report *report, int (*save)(Report *), on_failed_store failed) {
-  if (std::exchange(open_screen_is_noted, false)) tavro_journal_abandon();
   tavro_finish_interrupted_save();
   if (tavro_journal_write(report) != 0) {
     _discard_files(report);
@@ -205,4 +222,16 @@ int tavro_save_problem_compose_data(appdata *ad, int status) {
 
 int tavro_save_idea_compose_data(appdata *ad, int status) {
   return tavro_drafts_save_idea(ad, status, on_failed_store::end_screen);
+}
+
+int tavro_send_report(appdata *ad, tavro_dbmgr_bug_report_info *report) {
+  report->submitted = TAVRO_STATUS_SENDING;
+  tavro_create_notification(tavro_text("IDS_OB_TPOP_SENDING_FEEDBACK_ING_ABB"), report->description, ad);
+  if (tavro_compose_view(ad))
+    _store_note(ad);
+  else
+    _give_up_note();  // its screen has ended
+  const int id = _store(ad, report, tavro_dbmgr_update_bug_report, on_failed_store::keep_screen);
+  _after_store(ad, id, TAVRO_STATUS_SENDING);
+  return id;
 }

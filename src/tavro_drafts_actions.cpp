@@ -9,6 +9,7 @@
 #include "tavro-main.h"
 #include "tavro_autosave.h"
 #include "tavro_compose_keeper.h"
+#include "tavro_crash_archive.h"
 #include "tavro_dbmgr.h"
 #include "tavro_drafts.h"
 #include "tavro_drafts_save.h"
@@ -55,11 +56,14 @@ int _save_by_kind(appdata *ad, int status) {
                           : tavro_drafts_save_problem(ad, status, on_failed_store::keep_screen);
 }
 
-// A draft goes with its log, unless the record that replaces it has the same one.
+// A draft goes with its log, unless the record that replaces it has the same one, and with its dump, unless
+// any record has that.
 void _destroy_replaced_draft(int draft, const std::string &kept_log) {
   const TavroText log(tavro_dbmgr_get_voc_syslog_file_by_id(draft));
   if (log && log.get() != kept_log) tavro_delete_syslog_file(draft);
+  const TavroText dump(tavro_dbmgr_get_dump_file_by_id(draft));
   tavro_dbmgr_destroy_vocs_by_id(draft);
+  if (dump && *dump) tavro_crash_archive_delete_unneeded(dump.get());
 }
 
 // The draft that the screen came from and its automatic copy go when the new record is stored: a store that

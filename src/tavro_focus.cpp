@@ -1,5 +1,6 @@
 #include "tavro_focus.h"
 
+#include <cstring>
 #include <map>
 #include <utility>
 
@@ -44,6 +45,26 @@ Eina_Bool _touched_cb(void *win, int, void *) {
   return ECORE_CALLBACK_PASS_ON;
 }
 
+bool _can_have_focus(const Elm_Object_Item *item) {
+  return !elm_object_item_disabled_get(item) &&
+         elm_genlist_item_select_mode_get(item) != ELM_OBJECT_SELECT_MODE_DISPLAY_ONLY;
+}
+
+void _list_key_cb(void *, Evas *, Evas_Object *list, void *event_info) {
+  auto *key = static_cast<Evas_Event_Key_Down *>(event_info);
+  const bool is_down = std::strcmp(key->key, "Down") == 0;
+  if (!is_down && std::strcmp(key->key, "Up") != 0) return;
+  const auto step = is_down ? elm_genlist_item_next_get : elm_genlist_item_prev_get;
+  Elm_Object_Item *item = elm_object_focused_item_get(list);
+  if (item) item = step(item);
+  while (item && !_can_have_focus(item)) item = step(item);
+  if (!item) return;  // At its ends the toolkit leaves the list.
+  key->event_flags = static_cast<Evas_Event_Flags>(key->event_flags | EVAS_EVENT_FLAG_ON_HOLD);
+  tavro_focus_show(list);
+  elm_genlist_item_show(item, ELM_GENLIST_ITEM_SCROLLTO_IN);
+  elm_object_item_focus_set(item, EINA_TRUE);
+}
+
 }  // namespace
 
 void tavro_focus_remember(tavro_focus_memory *memory, const Evas_Object *win) {
@@ -82,6 +103,11 @@ void tavro_focus_keep_among(const std::vector<Evas_Object *> &widgets) {
 
 void tavro_focus_show(Evas_Object *widget) {
   elm_win_focus_highlight_enabled_set(elm_object_top_widget_get(widget), EINA_TRUE);
+}
+
+void tavro_focus_walk_list(Evas_Object *list) {
+  evas_object_event_callback_priority_add(list, EVAS_CALLBACK_KEY_DOWN, EVAS_CALLBACK_PRIORITY_BEFORE,
+                                          _list_key_cb, nullptr);
 }
 
 void tavro_focus_hide_at_touch(Evas_Object *win) {

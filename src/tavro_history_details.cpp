@@ -1,69 +1,68 @@
-// Details of one report: its way so far, what the person wrote and what the maker answered.
-#include <elm_atspi.h>
+// Details of one report: its way so far, what the person wrote and what the maker answered. This file is the
+// page's life.
+#include "tavro_history_details.h"
 
 #include <algorithm>
-#include <cstring>
-#include <string>
 
 #include "tavro-common.h"
 #include "tavro-main.h"
-#include "tavro_dbmgr.h"
-#include "tavro_details_text.h"
-#include "tavro_history.h"
 #include "tavro_log.h"
-#include "tavro_memory.h"
 #include "tavro_notifications.h"
 #include "tavro_preferences.h"
-#include "tavro_resend.h"
+#include "tavro_report_delete.h"
 #include "tavro_screens.h"
 #include "tavro_targets.h"
 #include "tavro_widgets.h"
 
 namespace {
 
-// The one details page that can be open; `page` null: none.
-struct details_page {
-  Evas_Object *page;
-  Evas_Object *scroller;
-  Evas_Object *box;
-  Elm_Object_Item *nf_it;
-  svc_voc_data *voc;  // owned
-} _details;
+details_page _details = {};
+Ecore_Job *_refresh_job = nullptr;
+Ecore_Job *_open_job = nullptr;
+int _voc_to_open = 0;
 
 void _page_deleted_cb(void *, Evas *, Evas_Object *page, void *) {
-  if (_details.page != page) return;
-  tavro_dbmgr_free_voc_data(_details.voc);
-  _details = {};
+  if (_details.page == page) _details = {};
 }
 
-// ---- Sending again ----
-
-void _close(appdata *) {
-  if (_details.nf_it) elm_object_item_del(_details.nf_it);
-}
-
-void _show_no_file_accessible(appdata *ad) {
-  tavro_popup_show(ad, &ad->history_file_popup, tavro_text("IDS_OB_HEADER_NOT_YET"),
-                   tavro_text("IDS_OB_BODY_FILES_GONE"), {{tavro_text("IDS_OB_BUTTON_OK"), nullptr}});
-}
-
-void _resend_clicked_cb(void *data, Evas_Object *button, void *event_info) {
-  appdata *ad = static_cast<appdata *>(data);
-  evas_object_data_set(button, "app_data", ad);
-  tavro_resend_register_screen({_show_no_file_accessible, _close});
-  tavro_send_cb(_details.voc, button, event_info);
+// Read the shown report anew, for other programs change it too. False when it is gone: then the page is, too,
+// and the person knows why.
+bool _reload(appdata *ad) {
+  TavroVoc voc = tavro_details_stored(_details.voc->id);
+  if (voc) {
+    _details.voc = std::move(voc);
+    _details.first = tavro_follow_up_first(_details.voc->id);
+    _details.follow_ups = tavro_follow_ups_of(_details.voc.get());
+    return true;
+  }
+  TAVRO_LOGD("report %d is gone", _details.voc->id);
+  tavro_details_close(ad);
+  tavro_details_say_gone(ad);
+  return false;
 }
 
 // ---- Building ----
 
-constexpr int kMarginUnits = 16;
-constexpr int kThumbUnits = 72;
-constexpr int kPicturesPerRow = 3;
+// The beginning of what support said last comes into view: it has just led the person here. Pages that were
+// pushed in one turn come up before they have a size; then it waits for that.
+void _show_answer() {
+  int shown_height = 0, page_top = 0, top = 0, height = 0;
+  elm_scroller_region_get(_details.scroller, nullptr, nullptr, nullptr, &shown_height);
+  _details.shows_answer_later = shown_height == 0;
+  if (_details.shows_answer_later) return;
+  evas_smart_objects_calculate(evas_object_evas_get(_details.page));
+  Eina_List *children = elm_box_children_get(_details.box);
+  const auto *answer = static_cast<const Evas_Object *>(eina_list_last_data_get(children));
+  eina_list_free(children);
+  evas_object_geometry_get(elm_object_content_get(_details.scroller), nullptr, &page_top, nullptr, nullptr);
+  evas_object_geometry_get(answer, nullptr, &top, nullptr, &height);
+  const int gap = static_cast<int>(12 * elm_config_scale_get());
+  elm_scroller_region_show(_details.scroller, 0, top - page_top - gap, 1,
+                           std::min(height + 2 * gap, shown_height));
+}
 
-int _text_width(const Evas_Object *scroller) {
-  int width = 0;
-  evas_object_geometry_get(scroller, nullptr, nullptr, &width, nullptr);
-  return std::max(1, width - static_cast<int>(2 * kMarginUnits * elm_config_scale_get()));
+void _show_answer_cb(void *) {
+  if (_details.page && _details.shows_answer_later) _show_answer();
 }
 
 // The page got another width: the texts wrap anew.
@@ -73,123 +72,54 @@ void _resized_cb(void *, Evas *, Evas_Object *scroller, void *) {
   EINA_LIST_FREE(children, child) {
     Evas_Object *strut =
         elm_object_part_content_get(static_cast<Evas_Object *>(child), "tavro.swallow.strut");
-    if (strut) evas_object_size_hint_min_set(strut, _text_width(scroller), 0);
+    if (strut) evas_object_size_hint_min_set(strut, tavro_details_text_width(scroller), 0);
   }
+  if (_details.shows_answer_later) ecore_job_add(_show_answer_cb, nullptr);
 }
 
-// A layout whose height follows from the width that its texts get.
-Evas_Object *_add_flowing(Evas_Object *box, const char *group) {
-  Evas_Object *layout = tavro_layout_add(box, group);
-  tavro_fill_width(layout);
-  Evas_Object *strut = evas_object_rectangle_add(evas_object_evas_get(box));
-  evas_object_color_set(strut, 0, 0, 0, 0);
-  evas_object_size_hint_min_set(strut, _text_width(_details.scroller), 0);
-  elm_object_part_content_set(layout, "tavro.swallow.strut", strut);
-  elm_box_pack_end(box, layout);
-  return layout;
-}
-
-void _build_status(Evas_Object *box, const svc_voc_data *voc) {
-  static const char *const kSignals[] = {"open", "done", "now", "stopped"};
-  Evas_Object *card = _add_flowing(box, "tavro/details/status");
-  const bool has_title = voc->title_description && *voc->title_description;
-  tavro_layout_text_set(card, "elm.text", has_title ? voc->title_description : voc->description);
-  tavro_layout_text_set(
-      card, "elm.text.sub",
-      (std::string(tavro_text("IDS_OB_BODY_MADE")) + " " + tavro_details_created(voc)).c_str());
-  const tavro_status_line line = tavro_details_status_line(voc->submitted);
-  std::string now;
-  for (int i = 0; i < 4; ++i) {
-    const std::string number = std::to_string(i + 1);
-    tavro_layout_text_set(card, ("tavro.text." + number).c_str(), tavro_text(line.labels[i]));
-    elm_object_signal_emit(card, ("tavro," + std::string(kSignals[line.steps[i]]) + "," + number).c_str(),
-                           "tavro");
-    if (i > 0 && line.steps[i] != TAVRO_STEP_OPEN)
-      elm_object_signal_emit(card, ("tavro,leg," + std::to_string(i)).c_str(), "tavro");
-    if (line.steps[i] == TAVRO_STEP_NOW || line.steps[i] == TAVRO_STEP_STOPPED)
-      now = tavro_text(line.labels[i]);
-  }
-  elm_object_focus_allow_set(card, EINA_FALSE);
-  elm_atspi_accessible_name_set(card, (std::string(tavro_text("IDS_OB_BODY_STATUS")) + ": " + now).c_str());
-}
-
-Evas_Object *_build_picture(Evas_Object *row, const char *path) {
-  const char *slash = std::strrchr(path, '/');
-  return tavro_button_add(row, "tavro_thumb_bubble", nullptr, tavro_picture_add(row, path, kThumbUnits),
-                          slash ? slash + 1 : path, nullptr, nullptr);
-}
-
-// Rows of as many pictures as a bubble is wide.
-Evas_Object *_build_pictures(Evas_Object *parent, const svc_voc_data *voc) {
-  const int gap = static_cast<int>(8 * elm_config_scale_get());
-  Evas_Object *rows = elm_box_add(parent), *row = nullptr;
-  elm_box_align_set(rows, 0.0, 0.0);
-  elm_box_padding_set(rows, 0, gap);
-  int count = 0;
-  for (const GSList *link = voc->attachments; link; link = link->next, ++count) {
-    if (count % kPicturesPerRow == 0) {
-      row = elm_box_add(rows);
-      elm_box_horizontal_set(row, EINA_TRUE);
-      elm_box_padding_set(row, gap, 0);
-      evas_object_size_hint_align_set(row, 0.0, 0.5);
-      evas_object_show(row);
-      elm_box_pack_end(rows, row);
-    }
-    elm_box_pack_end(
-        row, _build_picture(row, static_cast<const tavro_dbmgr_attachment_info *>(link->data)->file_path));
-  }
-  evas_object_show(rows);
-  return rows;
-}
-
-void _build_own_text(Evas_Object *box, const svc_voc_data *voc) {
-  const bool has_text = voc->description && *voc->description;
-  if (!has_text && !voc->attachments) return;
-  Evas_Object *bubble = _add_flowing(box, "tavro/details/mine");
-  tavro_layout_text_set(bubble, "elm.text.title", tavro_text("IDS_OB_BODY_YOU"));
-  tavro_layout_text_set(bubble, "elm.text", voc->description);
-  elm_atspi_accessible_name_set(bubble, voc->description);
-  if (voc->attachments) elm_object_content_set(bubble, _build_pictures(bubble, voc));
-}
-
-void _build_reply(Evas_Object *box, const tavro_reply &reply) {
-  Evas_Object *bubble = _add_flowing(box, "tavro/details/theirs");
-  std::string title = tavro_text("IDS_OB_BODY_SUPPORT");
-  if (!reply.time.empty()) title += " \xC2\xB7 " + reply.time;
-  tavro_layout_text_set(bubble, "elm.text.title", title.c_str());
-  // Replies are stored as markup of plain text; what is shown is made anew from the plain text.
-  const TavroText plain(TAVRO_ADOPT(elm_entry_markup_to_utf8(reply.markup.c_str())));
-  tavro_layout_text_set(bubble, "elm.text", plain.get());
-  elm_atspi_accessible_name_set(bubble, plain.get());
-}
-
-void _build_resend(appdata *ad) {
-  Evas_Object *bottom = tavro_layout_add(_details.page, "tavro/bottom");
-  elm_object_content_set(
-      bottom, tavro_button_add(bottom, "tavro_primary", tavro_text("IDS_OB_BUTTON_SEND_AGAIN"), nullptr,
-                               nullptr, _resend_clicked_cb, ad));
-  elm_object_part_content_set(_details.page, "tavro.swallow.bottom", bottom);
-  elm_object_signal_emit(_details.page, "tavro,bottom", "tavro");
-}
-
-void _show_report(appdata *ad) {
-  const svc_voc_data *voc = _details.voc;
+void _show_report() {
   elm_box_clear(_details.box);
-  _build_status(_details.box, voc);
-  _build_own_text(_details.box, voc);
-  for (const tavro_reply &reply : tavro_details_replies(voc)) _build_reply(_details.box, reply);
-  elm_object_part_content_set(_details.page, "tavro.swallow.bottom", nullptr);
-  if (tavro_details_can_resend(voc->submitted)) _build_resend(ad);
+  tavro_details_build(&_details);
+  tavro_details_build_actions(&_details);
 }
 
-void _mark_as_read(appdata *ad, int voc_id) {
-  tavro_dbmgr_update_read_push_notifications(voc_id, 1);
+// The same place of the page stays before the person's eyes.
+void _show_report_in_place() {
+  int x = 0, y = 0, width = 0, height = 0;
+  elm_scroller_region_get(_details.scroller, &x, &y, &width, &height);
+  const bool had_focus = elm_object_focus_get(_details.box);
+  _show_report();
+  evas_smart_objects_calculate(evas_object_evas_get(_details.page));
+  elm_scroller_region_show(_details.scroller, x, y, width, height);
+  if (had_focus) elm_object_focus_set(_details.scroller, EINA_TRUE);
+}
+
+void _mark_as_read() {
+  tavro_dbmgr_update_read_push_notifications(_details.voc->id, 1);
+  for (const tavro_follow_up &follow_up : _details.follow_ups)
+    if (follow_up.voc->push_comments && follow_up.voc->push_read == 0)
+      tavro_dbmgr_update_read_push_notifications(follow_up.voc->id, 1);
   const TavroText user_name = tavro_get_username_from_preference();
-  tavro_refresh_unread_count(ad, user_name.get());
-  tavro_update_landing_page_history_badge(ad);
+  tavro_refresh_unread_count(_details.ad, user_name.get());
+  tavro_update_landing_page_history_badge(_details.ad);
 }
 
-Evas_Object *_build_box() {
+// They have led the person here, or have become needless. Those that come while the page is open stay: the
+// window may be hidden.
+void _remove_notifications() {
+  tavro_remove_reply_notification(_details.voc->id);
+  for (const tavro_follow_up &follow_up : _details.follow_ups)
+    tavro_remove_reply_notification(follow_up.voc->id);
+}
+
+bool _has_unread_answer() {
+  const auto is_unread = [](const svc_voc_data *voc) { return voc->push_comments && voc->push_read == 0; };
+  return is_unread(_details.voc.get()) ||
+         std::any_of(_details.follow_ups.begin(), _details.follow_ups.end(),
+                     [&](const tavro_follow_up &follow_up) { return is_unread(follow_up.voc.get()); });
+}
+
+void _build_box() {
   _details.box = tavro_scrolled_box_add(_details.page, &_details.scroller);
   Evas_Object *scroller = _details.scroller;
   evas_object_event_callback_add(scroller, EVAS_CALLBACK_RESIZE, _resized_cb, nullptr);
@@ -199,39 +129,131 @@ Evas_Object *_build_box() {
   tavro_fill_width(margins);
   elm_object_content_set(margins, _details.box);
   elm_object_content_set(scroller, margins);
-  return scroller;
+  elm_object_content_set(_details.page, scroller);
+}
+
+// Cards and bubbles take the focus, so that the keys lead through the page; what has it comes into view.
+void _focus_child(void *(*choose)(const Eina_List *children)) {
+  Eina_List *children = elm_box_children_get(_details.box);
+  elm_object_focus_set(static_cast<Evas_Object *>(choose(children)), EINA_TRUE);
+  eina_list_free(children);
+}
+
+// The naviframe gives the focus of a page that comes up to its first button, where a blank would close it.
+void _focus_start_cb(void *, Evas_Object *nf, void *) {
+  evas_object_smart_callback_del(nf, "transition,finished", _focus_start_cb);
+  if (_details.page && elm_naviframe_top_item_get(nf) == _details.nf_it) _focus_child(eina_list_data_get);
+}
+
+void _focus_end_cb(void *, Evas_Object *nf, void *) {
+  evas_object_smart_callback_del(nf, "transition,finished", _focus_end_cb);
+  if (!_details.page || elm_naviframe_top_item_get(nf) != _details.nf_it) return;
+  _focus_child(eina_list_last_data_get);
+  int content = 0;
+  evas_smart_objects_calculate(evas_object_evas_get(_details.page));
+  elm_scroller_child_size_get(_details.scroller, nullptr, &content);
+  elm_scroller_region_show(_details.scroller, 0, std::max(0, content - 1), 1, 1);
+}
+
+void _focus_answer_cb(void *, Evas_Object *nf, void *) {
+  evas_object_smart_callback_del(nf, "transition,finished", _focus_answer_cb);
+  if (!_details.page || elm_naviframe_top_item_get(nf) != _details.nf_it) return;
+  _focus_child(eina_list_last_data_get);
+  _show_answer();
+}
+
+// As the report of the page, in its conversation, or as the one that it follows up.
+bool _is_shown(int voc_id) {
+  if (!_details.page) return false;
+  if (_details.voc->id == voc_id || (_details.first && _details.first->id == voc_id)) return true;
+  const int first = tavro_dbmgr_get_follow_up(voc_id, nullptr);
+  return first > 0 && first == _details.voc->server_voc_id;
 }
 
 }  // namespace
 
+TavroVoc tavro_details_stored(int voc_id) {
+  TavroVoc voc(tavro_delete_is_waiting(voc_id) ? nullptr : tavro_dbmgr_get_voc_by_id(voc_id));
+  if (voc && !tavro_is_for_signed_in_user(voc->user_name)) voc.reset();
+  return voc;
+}
+
+void tavro_details_say_gone(appdata *ad) {
+  tavro_popup_show(ad, &ad->history_file_popup, tavro_text("IDS_OB_HEADER_REPORT_GONE"),
+                   tavro_text("IDS_OB_BODY_REPORT_GONE"), {{tavro_text("IDS_OB_BUTTON_OK"), nullptr}});
+}
+
+TavroVoc tavro_details_stored_now() {
+  if (!_details.page) return TavroVoc();
+  TavroVoc voc = tavro_details_stored(_details.voc->id);
+  if (!voc || g_strcmp0(voc->submitted, _details.voc->submitted) != 0) tavro_details_refresh_later();
+  return voc;
+}
+
+void tavro_details_close(appdata *) {
+  if (_details.nf_it) elm_object_item_del(_details.nf_it);
+}
+
+void tavro_details_refresh_later() {
+  if (_refresh_job) return;
+  _refresh_job = ecore_job_add(
+      [](void *) {
+        _refresh_job = nullptr;
+        if (_details.page) tavro_update_history_details_page(_details.ad, _details.voc->id);
+      },
+      nullptr);
+}
+
+void tavro_details_show_end() {
+  if (_details.page)
+    evas_object_smart_callback_add(_details.ad->nf, "transition,finished", _focus_end_cb, nullptr);
+}
+
+void tavro_details_open_later(int voc_id) {
+  _voc_to_open = voc_id;
+  if (_open_job) return;
+  _open_job = ecore_job_add(
+      [](void *) {
+        _open_job = nullptr;
+        if (_details.page) tavro_create_history_details_page(_details.ad, _voc_to_open);
+      },
+      nullptr);
+}
+
 void tavro_update_history_details_page(appdata *ad, int voc_id) {
-  if (!_details.page || _details.voc->id != voc_id) return;
-  svc_voc_data *voc = tavro_dbmgr_get_voc_by_id(voc_id);
-  if (!voc) return;
-  tavro_dbmgr_free_voc_data(_details.voc);
-  _details.voc = voc;
-  _show_report(ad);
+  if (!_is_shown(voc_id) || !_reload(ad)) return;
+  _show_report_in_place();
   // The answer is on the screen: it has been read.
-  if (voc->push_comments && voc->push_read == 0) _mark_as_read(ad, voc_id);
+  if (_has_unread_answer()) _mark_as_read();
 }
 
 void tavro_create_history_details_page(appdata *ad, int voc_id) {
   if (!ad->nf) return;
-  svc_voc_data *voc = tavro_dbmgr_get_voc_by_id(voc_id);
+  TavroVoc voc = tavro_details_stored(voc_id);
   if (!voc) {
     TAVRO_LOGD("no report with id %d", voc_id);
-    tavro_popup_show(ad, &ad->history_file_popup, tavro_text("IDS_OB_HEADER_REPORT_GONE"),
-                     tavro_text("IDS_OB_BODY_REPORT_GONE"), {{tavro_text("IDS_OB_BUTTON_OK"), nullptr}});
-    return;
+    return tavro_details_say_gone(ad);
   }
-  _close(ad);
-  const char *title = voc->app_name ? tavro_target_text(voc->app_name) : "";
+  // Only a touched notification leads to the page that is open: its answer came while nobody was looking.
+  const bool is_open = _details.page && _details.voc->id == voc_id;
+  tavro_details_close(ad);
+  const std::string title = tavro_details_text(tavro_target_text(voc->app_name));
   _details = {};
-  _details.voc = voc;
-  _details.page = tavro_page_add(ad, title, "back");
+  _details.ad = ad;
+  _details.voc = std::move(voc);
+  _details.first = tavro_follow_up_first(voc_id);
+  _details.follow_ups = tavro_follow_ups_of(_details.voc.get());
+  _details.shown_states = kStatesAtFirst;
+  _details.shown_messages = kMessagesAtFirst;
+  _details.page = tavro_page_add(ad, title.c_str(), "back");
   evas_object_event_callback_add(_details.page, EVAS_CALLBACK_DEL, _page_deleted_cb, nullptr);
-  elm_object_content_set(_details.page, _build_box());
-  _show_report(ad);
-  _details.nf_it = tavro_page_push(ad, _details.page, title);
-  _mark_as_read(ad, voc_id);
+  _build_box();
+  _show_report();
+  const bool shows_answer =
+      _details.messages.back().kind == TAVRO_MESSAGE_REPLY && (is_open || _has_unread_answer());
+  evas_object_smart_callback_add(ad->nf, "transition,finished",
+                                 shows_answer ? _focus_answer_cb : _focus_start_cb, nullptr);
+  _details.nf_it = tavro_page_push(ad, _details.page, title.c_str());
+  _mark_as_read();
+  _remove_notifications();
 }

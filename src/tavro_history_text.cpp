@@ -1,10 +1,14 @@
 #include "tavro_history_text.h"
 
+#include <Ecore.h>
 #include <Elementary.h>
 #include <glib.h>
 #include <vconf.h>
 
 #include <algorithm>
+#include <cctype>
+#include <cerrno>
+#include <climits>
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
@@ -22,6 +26,8 @@ namespace {
 constexpr unsigned long long kMillisecondsPerSecond = 1000;
 constexpr int kTwelveHourClock = 1;
 constexpr int kNoon = 12;
+constexpr int kNoStatus = -1;
+constexpr int kLastYear = 9999;
 constexpr size_t kTimeTextSize = 32;
 
 std::string _to_markup(const char *text) {
@@ -40,18 +46,18 @@ std::string _title_text(const svc_voc_data *voc) {
 }
 
 std::string _time_text(const svc_voc_data *voc) {
-  if (!voc->date_of_updation) return "";
-  // strtoull stops at the "#" behind the newest time.
-  const struct tm when = _tavro_get_date_time(std::strtoull(voc->date_of_updation, nullptr, 10));
-  const TavroText text(tavro_get_time_string(&when));
-  return text ? text.get() : "";
+  return tavro_shown_time(voc->date_of_updation);  // the newest comes first
+}
+
+// A number that no status has, for one that is too large, rather than one that its last digits make.
+int _status_value(const char *token) {
+  const long value = token ? std::strtol(token, nullptr, 10) : kNoStatus;
+  return value < INT_MIN || value > INT_MAX ? kNoStatus : static_cast<int>(value);
 }
 
 std::string _status_text(const svc_voc_data *voc) {
-  const char *last = voc->submitted ? std::strrchr(voc->submitted, '#') : nullptr;
-  const char *token = last ? last + 1 : voc->submitted;
   const char *text = "";
-  _tavro_get_status(token, &text);
+  _tavro_get_status(tavro_dbmgr_current_state(voc->submitted), &text);
   switch (tavro_current_status(voc->submitted)) {
     case TAVRO_STATUS_SENDING_FAILED:
     case TAVRO_STATUS_SENDING_FAILED_NO_NETWORK:
@@ -62,6 +68,25 @@ std::string _status_text(const svc_voc_data *voc) {
     default:
       return text;
   }
+}
+
+// The setting is read from the desktop or from the disk, which takes longer than all the rest of a row; what
+// is read holds until the main loop goes round, so that a list asks once for all its rows.
+struct known_clock {
+  int format;
+  Ecore_Job *end;  // null: not known
+} _clock = {};
+
+void _forget_clock_cb(void *) {
+  _clock = {};
+}
+
+int _clock_format() {
+  if (_clock.end) return _clock.format;
+  int format = kTwelveHourClock;
+  vconf_get_int(VCONFKEY_REGIONFORMAT_TIME1224, &format);
+  _clock = {format, ecore_job_add(_forget_clock_cb, nullptr)};
+  return format;
 }
 
 struct row_part {
@@ -88,9 +113,7 @@ void tavro_parse_status_string(const char *text, char ***tokens, int *count) {
 }
 
 int tavro_current_status(const char *submitted) {
-  if (!submitted) return -1;
-  const char *last = std::strrchr(submitted, '#');
-  return static_cast<int>(std::strtol(last ? last + 1 : submitted, nullptr, 10));
+  return _status_value(tavro_dbmgr_current_state(submitted));
 }
 
 struct tm _tavro_get_date_time(unsigned long long milliseconds) {
@@ -122,13 +145,21 @@ char *tavro_get_time_string(const struct tm *when) {
   const time_t now_seconds = std::time(nullptr);
   struct tm now = {};
   localtime_r(&now_seconds, &now);
-  int clock_format = kTwelveHourClock;
-  vconf_get_int(VCONFKEY_REGIONFORMAT_TIME1224, &clock_format);
-  return tavro_get_time_string_at(when, &now, clock_format);
+  return tavro_get_time_string_at(when, &now, _clock_format());
+}
+
+std::string tavro_shown_time(const char *milliseconds) {
+  if (!milliseconds || !std::isdigit(static_cast<unsigned char>(*milliseconds))) return "";
+  errno = 0;
+  const unsigned long long time = std::strtoull(milliseconds, nullptr, 10);
+  const struct tm when = _tavro_get_date_time(time);
+  if (errno != 0 || when.tm_mday == 0 || when.tm_year + 1900 > kLastYear) return "";
+  const TavroText text(tavro_get_time_string(&when));
+  return text.get();
 }
 
 void _tavro_get_status(const char *token, const char **text) {
-  switch (token ? std::strtol(token, nullptr, 10) : -1) {
+  switch (_status_value(token)) {
     case TAVRO_STATUS_SENDING_FAILED:
     case TAVRO_STATUS_SENDING_FAILED_NO_NETWORK:
       *text = tavro_text("IDS_OB_SBODY_SENDING_FAILED");

@@ -9,12 +9,14 @@
 #include "tavro_appdata.h"
 #include "tavro_autosave.h"
 #include "tavro_compose_keeper.h"
+#include "tavro_crash_report.h"
 #include "tavro_dbmgr.h"
 #include "tavro_log.h"
 #include "tavro_memcheck.h"
 #include "tavro_not_yet.h"
 #include "tavro_preferences.h"
 #include "tavro_recovery.h"
+#include "tavro_report_delete.h"
 #include "tavro_resume.h"
 #include "tavro_service_bridge.h"
 #include "tavro_version_check.h"
@@ -58,6 +60,7 @@ void _end_capture(appdata *ad) {
 void _release_everything(appdata *ad) {
   if (ad->win) evas_object_del(ad->win);
   ad->win = nullptr;
+  tavro_crash_report_at_end();
   tavro_dealloc_memory(ad);
 }
 
@@ -81,8 +84,9 @@ bool app_create(void *user_data) {
   return true;
 }
 
-void app_pause(void *) {
+void app_pause(void *user_data) {
   TAVRO_LOGD("app pause");
+  tavro_delete_finish(static_cast<appdata *>(user_data));
   tavro_compose_keeper_flush();
 }
 
@@ -97,6 +101,8 @@ void app_resume(void *user_data) {
 void app_terminate(void *user_data) {
   auto *ad = static_cast<appdata *>(user_data);
   TAVRO_LOGD("app terminate");
+  tavro_delete_finish(ad);
+  tavro_forget_due_version_popup();
   _end_capture(ad);
   if (preference_set_boolean(TAVRO_PREF_SYSLOGS, false) != PREFERENCE_ERROR_NONE) {
     TAVRO_LOGD("Preference reset value failed for TAVRO_PREF_SYSLOGS");

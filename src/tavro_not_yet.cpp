@@ -50,7 +50,3 @@ void tavro_refresh_beta_pages(appdata *, const char *what) {
 void tavro_refresh_banners(appdata *) {
   TAVRO_NOT_YET("the banner carousel");
 }
-
-void tavro_sign_out(appdata *) {
-  TAVRO_NOT_YET("signing out");
-}

@@ -5,6 +5,8 @@
 
 #include <cstring>
 #include <string>
+#include <utility>
+#include <vector>
 
 #include "tavro-common.h"
 #include "tavro-main.h"
@@ -17,6 +19,7 @@
 namespace {
 
 constexpr glong kContentCharacters = 200;
+constexpr char kClientName[] = "Vantor Community";
 
 using ScopedNotification = TavroHandle<std::remove_pointer_t<notification_h>, notification_free>;
 
@@ -31,16 +34,28 @@ std::string _shortened(const char *text) {
          "…";
 }
 
-void _set_texts(notification_h noti, const char *title, const char *content) {
-  _log_failure("notification_set_text", notification_set_text(noti, NOTIFICATION_TEXT_TYPE_TITLE, title,
+// What the store holds need not be UTF-8, which a notification is.
+void _set_text(notification_h noti, notification_text_type_e type, const char *text) {
+  const TavroGText valid(g_utf8_make_valid(text, -1));
+  _log_failure("notification_set_text", notification_set_text(noti, type, _shortened(valid.get()).c_str(),
                                                               nullptr, NOTIFICATION_VARIABLE_TYPE_NONE));
-  if (!content) return;
-  _log_failure("notification_set_text",
-               notification_set_text(noti, NOTIFICATION_TEXT_TYPE_CONTENT, _shortened(content).c_str(),
-                                     nullptr, NOTIFICATION_VARIABLE_TYPE_NONE));
 }
 
-void _set_click(notification_h noti, int voc_id) {
+void _set_texts(notification_h noti, const char *title, const char *content) {
+  _set_text(noti, NOTIFICATION_TEXT_TYPE_TITLE, title);
+  if (content) _set_text(noti, NOTIFICATION_TEXT_TYPE_CONTENT, content);
+}
+
+using Extras = std::vector<std::pair<const char *, std::string>>;
+
+// What a touch of the notification sends to the client, beside that it was touched.
+Extras _about_report(int voc_id) {
+  Extras extras = {{TAVRO_NOTIFICATION_TYPE, TAVRO_NOTIFICATION_VOC}};
+  if (voc_id > 0) extras.emplace_back(TAVRO_NOTIFICATION_VOC_ID, std::to_string(voc_id));
+  return extras;
+}
+
+void _set_click(notification_h noti, const Extras &extras) {
   int ret = APP_CONTROL_ERROR_NONE;
   const TavroRequest click = tavro_request_create(&ret);
   if (!click) {
@@ -50,10 +65,7 @@ void _set_click(notification_h noti, int voc_id) {
   app_control_set_operation(click.get(), APP_CONTROL_OPERATION_DEFAULT);
   app_control_set_app_id(click.get(), TAVRO_APP_ID);
   app_control_add_extra_data(click.get(), TAVRO_NOTIFICATION_EVENT, TAVRO_NOTIFICATION_CLICKED);
-  app_control_add_extra_data(click.get(), TAVRO_NOTIFICATION_TYPE, TAVRO_NOTIFICATION_VOC);
-  if (voc_id > 0) {
-    app_control_add_extra_data(click.get(), TAVRO_NOTIFICATION_VOC_ID, std::to_string(voc_id).c_str());
-  }
+  for (const auto &[key, value] : extras) app_control_add_extra_data(click.get(), key, value.c_str());
   _log_failure("notification_set_launch_option",
                notification_set_launch_option(noti, NOTIFICATION_LAUNCH_OPTION_APP_CONTROL, click.get()));
 }
@@ -65,8 +77,34 @@ ScopedNotification _make(notification_type_e type, const char *title, const char
     return nullptr;
   }
   _set_texts(noti.get(), title, content);
-  _set_click(noti.get(), voc_id);
+  _set_click(noti.get(), _about_report(voc_id));
   return noti;
+}
+
+std::string _reply_tag(int voc_id) {
+  return "TAVRO_REPLY_" + std::to_string(voc_id);
+}
+
+// The news under this tag, whoever posted them, have these texts now. Without a tag they are news of their
+// own.
+void _post_news(const std::string &tag, const char *title, const char *content, const Extras &extras) {
+  if (!tavro_preference_flag(TAVRO_PREF_NOTIFY, true)) {
+    TAVRO_LOGD("notifications are switched off");
+    return;
+  }
+  ScopedNotification noti(tag.empty() ? nullptr : notification_load_by_tag(tag.c_str()));
+  const bool is_known = static_cast<bool>(noti);
+  if (!is_known) noti.reset(notification_create(NOTIFICATION_TYPE_NOTI));
+  if (!noti) {
+    TAVRO_LOGE("notification_create failed");
+    return;
+  }
+  if (!is_known && !tag.empty())
+    _log_failure("notification_set_tag", notification_set_tag(noti.get(), tag.c_str()));
+  _set_texts(noti.get(), title, content);
+  _set_click(noti.get(), extras);
+  _log_failure("notification_post",
+               is_known ? notification_update(noti.get()) : notification_post(noti.get()));
 }
 
 }  // namespace
@@ -93,13 +131,23 @@ void tavro_remove_sending_notification(appdata *ad) {
 }
 
 void tavro_create_push_notification(const char *reply, int voc_id) {
-  if (!tavro_preference_flag(TAVRO_PREF_NOTIFY, true)) {
-    TAVRO_LOGD("notifications are switched off");
-    return;
-  }
   const char *title = tavro_text(reply ? "IDS_OB_MBODY_NEW_REPLY" : "IDS_OB_MBODY_REPORT_UPDATED");
-  const ScopedNotification noti = _make(NOTIFICATION_TYPE_NOTI, title, reply, voc_id);
-  if (noti) _log_failure("notification_post", notification_post(noti.get()));
+  _post_news(voc_id > 0 ? _reply_tag(voc_id) : "", title, reply, _about_report(voc_id));
+}
+
+void tavro_remove_reply_notification(int voc_id) {
+  const ScopedNotification noti(notification_load_by_tag(_reply_tag(voc_id).c_str()));
+  if (noti) _log_failure("notification_delete", notification_delete(noti.get()));
+}
+
+void tavro_create_non_voc_notification(const char *title, const char *content, const char *beta_id,
+                                       const char *noti_id) {
+  Extras extras = {{TAVRO_NOTIFICATION_TYPE, TAVRO_NOTIFICATION_NONVOC}};
+  if (beta_id) extras.emplace_back(TAVRO_NOTIFICATION_BETA_ID, beta_id);
+  if (noti_id) extras.emplace_back(TAVRO_NOTIFICATION_NOTI_ID, noti_id);
+  const bool has_id = noti_id && *noti_id;
+  _post_news(has_id ? std::string("TAVRO_NEWS_") + noti_id : "", title && *title ? title : kClientName,
+             content, extras);
 }
 
 void tavro_create_noti_badge_on_appicon(int count) {

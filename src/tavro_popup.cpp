@@ -4,10 +4,12 @@
 
 #include <algorithm>
 #include <cstring>
+#include <string>
 
 #include "tavro-common.h"
 #include "tavro-main.h"
 #include "tavro_focus.h"
+#include "tavro_handles.h"
 #include "tavro_log.h"
 #include "tavro_memory.h"
 #include "tavro_widgets.h"
@@ -18,12 +20,14 @@ constexpr char kStateKey[] = "tavro,popup";
 constexpr int kSideUnits = 32;    // beside the column of a popup
 constexpr int kAroundUnits = 60;  // above and below it: the card's edge and what is left of the window
 constexpr int kButtonsGapUnits = 14;
+constexpr int kTileUnits = 44;
 
 struct popup_state {
   Evas_Object **slot;
   tavro_focus_memory focus;  // where the keyboard was
   // Of a popup with texts; `strut` gives these their width, `room` is as tall as what is seen of them.
   Evas_Object *text, *strut, *room, *buttons;
+  Evas_Object *main;  // button as wide as the card; null: none
 };
 
 struct button_state {
@@ -73,25 +77,34 @@ Evas_Object *_overlay_add(appdata *ad, Evas_Object **slot, const char *group) {
   return popup;
 }
 
+Evas_Object *_add_button(appdata *ad, Evas_Object *popup, Evas_Object *box, const char *style,
+                         const tavro_popup_button &button) {
+  button_state *state = TAVRO_ZALLOC(button_state);
+  state->ad = ad;
+  state->popup = popup;
+  state->clicked = button.clicked;
+  Evas_Object *added = tavro_button_add(box, style, button.text, nullptr, nullptr, _button_clicked_cb, state);
+  evas_object_event_callback_add(added, EVAS_CALLBACK_DEL, _button_deleted_cb, state);
+  return added;
+}
+
+// `main` (may be null) is a button above them that has the focus first.
 void _add_buttons(appdata *ad, Evas_Object *popup, Evas_Object *box, const char *style,
-                  const std::vector<tavro_popup_button> &buttons) {
+                  const std::vector<tavro_popup_button> &buttons, Evas_Object *main = nullptr) {
   std::vector<Evas_Object *> added;
+  if (main) added.push_back(main);
   const bool has_lines = std::strcmp(style, "tavro_menu") == 0;  // each entry as wide as the menu
   for (const tavro_popup_button &button : buttons) {
-    button_state *state = TAVRO_ZALLOC(button_state);
-    state->ad = ad;
-    state->popup = popup;
-    state->clicked = button.clicked;
-    Evas_Object *one = tavro_button_add(box, style, button.text, nullptr, nullptr, _button_clicked_cb, state);
-    evas_object_event_callback_add(one, EVAS_CALLBACK_DEL, _button_deleted_cb, state);
+    Evas_Object *one = _add_button(ad, popup, box, style, button);
     evas_object_size_hint_align_set(one, has_lines ? EVAS_HINT_FILL : 1.0, 0.5);
     elm_box_pack_end(box, one);
     added.push_back(one);
   }
   evas_object_show(box);
+  if (added.empty()) return;
   tavro_focus_keep_among(added);
-  // A menu begins at its top; of a popup the last button is the main one.
-  if (!added.empty()) elm_object_focus_set(has_lines ? added.front() : added.back(), EINA_TRUE);
+  // A menu begins at its top; of a popup without a main button the last one is that.
+  elm_object_focus_set(has_lines || main ? added.front() : added.back(), EINA_TRUE);
 }
 
 int _units(int units) {
@@ -131,12 +144,16 @@ void _fit_cb(void *popup, Evas *, Evas_Object *, void *) {
   const int buttons_height = _arrange_buttons(state->buttons, width);
   evas_object_size_hint_min_set(state->strut, width, 0);
   edje_object_size_min_restricted_calc(elm_layout_edje_get(state->text), nullptr, &text_height, width, 0);
-  const int left = std::max(1, height - _units(kAroundUnits + kButtonsGapUnits) - buttons_height);
+  int main_height = 0;
+  if (state->main) evas_object_size_hint_min_get(state->main, nullptr, &main_height);
+  const int gaps = state->main ? 2 * kButtonsGapUnits : kButtonsGapUnits;
+  const int left = std::max(1, height - _units(kAroundUnits + gaps) - buttons_height - main_height);
   evas_object_size_hint_min_set(state->room, 0, std::min(text_height, left));
 }
 
 // Texts that scroll, in a place that is as tall as _fit_cb() says.
-Evas_Object *_add_texts(popup_state *state, Evas_Object *column, const char *title, const char *body) {
+Evas_Object *_add_texts(popup_state *state, Evas_Object *column, const char *group, const char *title,
+                        const char *body) {
   Evas_Object *place = elm_table_add(column), *scroller = nullptr;
   tavro_fill_width(place);
   state->room = _clear_rectangle_add(place);
@@ -146,7 +163,7 @@ Evas_Object *_add_texts(popup_state *state, Evas_Object *column, const char *tit
   evas_object_size_hint_align_set(scroller, EVAS_HINT_FILL, EVAS_HINT_FILL);
   elm_object_focus_allow_set(scroller, EINA_FALSE);
   elm_table_pack(place, scroller, 0, 0, 1, 1);
-  state->text = tavro_layout_add(box, "tavro/popup_text");
+  state->text = tavro_layout_add(box, group);
   tavro_fill_width(state->text);
   state->strut = _clear_rectangle_add(box);
   elm_object_part_content_set(state->text, "tavro.swallow.strut", state->strut);
@@ -155,6 +172,46 @@ Evas_Object *_add_texts(popup_state *state, Evas_Object *column, const char *tit
   elm_box_pack_end(box, state->text);
   evas_object_show(place);
   return place;
+}
+
+popup_state *_state_of(const Evas_Object *popup) {
+  return static_cast<popup_state *>(evas_object_data_get(popup, kStateKey));
+}
+
+// The column of a popup, which begins with its texts.
+Evas_Object *_add_column(Evas_Object *popup, const char *group, const char *title, const char *body) {
+  elm_atspi_accessible_name_set(popup, title);
+  elm_atspi_accessible_description_set(popup, body);
+  Evas_Object *column = elm_box_add(popup);
+  elm_box_padding_set(column, 0, _units(kButtonsGapUnits));
+  elm_box_pack_end(column, _add_texts(_state_of(popup), column, group, title, body));
+  elm_object_content_set(popup, column);
+  return column;
+}
+
+Evas_Object *_add_button_box(popup_state *state, Evas_Object *column) {
+  state->buttons = elm_box_add(column);
+  tavro_fill_width(state->buttons);
+  elm_box_align_set(state->buttons, 1.0, 0.5);
+  elm_box_pack_end(column, state->buttons);
+  return state->buttons;
+}
+
+// From the start to the end of the main button above them.
+void _spread(Evas_Object *box) {
+  const TavroHandle<Eina_List, eina_list_free> buttons(elm_box_children_get(box));
+  if (auto *first = static_cast<Evas_Object *>(eina_list_data_get(buttons.get()))) {
+    evas_object_size_hint_weight_set(first, EVAS_HINT_EXPAND, 0.0);
+    evas_object_size_hint_align_set(first, 0.0, 0.5);
+  }
+}
+
+void _fit_always(Evas_Object *popup) {
+  const popup_state *state = _state_of(popup);
+  evas_object_event_callback_add(popup, EVAS_CALLBACK_RESIZE, _fit_cb, popup);
+  for (Evas_Object *part : {state->text, state->buttons})
+    evas_object_event_callback_add(part, EVAS_CALLBACK_CHANGED_SIZE_HINTS, _fit_cb, popup);
+  _fit_cb(popup, nullptr, nullptr, nullptr);
 }
 
 Evas_Object *_entries_show(appdata *ad, Evas_Object **slot, const char *group,
@@ -168,6 +225,16 @@ Evas_Object *_entries_show(appdata *ad, Evas_Object **slot, const char *group,
   return menu;
 }
 
+std::vector<Evas_Object **> _slots(appdata *ad) {
+  return {
+      &ad->version_popup,      &ad->delete_fd_popup, &ad->delete_popup,     &ad->history_edit_popup,
+      &ad->history_file_popup, &ad->settings_popup,  &ad->imgedit_popup,    &ad->cancel_popup,
+      &ad->connection_popup,   &ad->crash_popup,     &ad->signout_popup,    &ad->crashpopup_win,
+      &ad->cpmgr_popup,        &ad->quit_beta_popup, &ad->next_steps_popup, &ad->corvane_account_optin_popup,
+      &ad->opt_out_popup,
+  };
+}
+
 }  // namespace
 
 Evas_Object *tavro_popup_show(appdata *ad, Evas_Object **slot, const char *title, const char *body,
@@ -177,23 +244,46 @@ Evas_Object *tavro_popup_show(appdata *ad, Evas_Object **slot, const char *title
     TAVRO_LOGE("popup cannot be shown: %s", title);
     return nullptr;
   }
-  elm_atspi_accessible_name_set(popup, title);
-  elm_atspi_accessible_description_set(popup, body);
-  popup_state *state = static_cast<popup_state *>(evas_object_data_get(popup, kStateKey));
-  Evas_Object *column = elm_box_add(popup);
-  elm_box_padding_set(column, 0, _units(kButtonsGapUnits));
-  elm_box_pack_end(column, _add_texts(state, column, title, body));
-  state->buttons = elm_box_add(column);
-  tavro_fill_width(state->buttons);
-  elm_box_align_set(state->buttons, 1.0, 0.5);
-  elm_box_pack_end(column, state->buttons);
-  elm_object_content_set(popup, column);
-  _add_buttons(ad, popup, state->buttons, "tavro_flat", buttons);
-  evas_object_event_callback_add(popup, EVAS_CALLBACK_RESIZE, _fit_cb, popup);
-  for (Evas_Object *part : {state->text, state->buttons})
-    evas_object_event_callback_add(part, EVAS_CALLBACK_CHANGED_SIZE_HINTS, _fit_cb, popup);
-  _fit_cb(popup, nullptr, nullptr, nullptr);
+  popup_state *state = _state_of(popup);
+  Evas_Object *column = _add_column(popup, "tavro/popup_text", title, body);
+  _add_buttons(ad, popup, _add_button_box(state, column), "tavro_flat", buttons);
+  _fit_always(popup);
   return popup;
+}
+
+Evas_Object *tavro_card_show(appdata *ad, Evas_Object **slot, const tavro_card &card,
+                             const std::vector<tavro_popup_button> &others) {
+  Evas_Object *popup = _overlay_add(ad, slot, "tavro/popup");
+  if (!popup) {
+    TAVRO_LOGE("popup cannot be shown: %s", card.title);
+    return nullptr;
+  }
+  popup_state *state = _state_of(popup);
+  Evas_Object *column = _add_column(popup, "tavro/card_text", card.title, card.body);
+  tavro_card_subtitle_set(popup, card.subtitle);
+  Evas_Object *tile = card.picture ? tavro_picture_add(state->text, card.picture, kTileUnits)
+                                   : tavro_tile_add(state->text, card.tile);
+  elm_object_part_content_set(state->text, "elm.swallow.icon", tile);
+  if (card.main.text) {
+    Evas_Object *frame = tavro_layout_add(column, "tavro/card_main");
+    tavro_fill_width(frame);
+    state->main = _add_button(ad, popup, frame, "tavro_primary", card.main);
+    elm_object_content_set(frame, state->main);
+    elm_box_pack_end(column, frame);
+  }
+  _add_buttons(ad, popup, _add_button_box(state, column), "tavro_flat", others, state->main);
+  if (state->main) _spread(state->buttons);
+  _fit_always(popup);
+  return popup;
+}
+
+void tavro_card_subtitle_set(Evas_Object *popup, const char *subtitle) {
+  const popup_state *state = _state_of(popup);
+  if (!state) return;
+  tavro_layout_text_set(state->text, "elm.text.sub", subtitle);
+  const char *body = elm_object_part_text_get(state->text, "elm.text.body");
+  const TavroText plain(TAVRO_ADOPT(elm_entry_markup_to_utf8(body)));
+  elm_atspi_accessible_description_set(popup, (std::string(subtitle) + "\n" + plain.get()).c_str());
 }
 
 Evas_Object *tavro_menu_show(appdata *ad, Evas_Object **slot,
@@ -211,16 +301,15 @@ Evas_Object *tavro_sheet_show(appdata *ad, Evas_Object **slot, const char *title
 }
 
 void tavro_delete_all_popup(appdata *ad) {
-  Evas_Object **const slots[] = {
-      &ad->version_popup,      &ad->delete_fd_popup, &ad->delete_popup,     &ad->history_edit_popup,
-      &ad->history_file_popup, &ad->settings_popup,  &ad->imgedit_popup,    &ad->cancel_popup,
-      &ad->connection_popup,   &ad->crash_popup,     &ad->signout_popup,    &ad->crashpopup_win,
-      &ad->cpmgr_popup,        &ad->quit_beta_popup, &ad->next_steps_popup, &ad->corvane_account_optin_popup,
-      &ad->opt_out_popup,
-  };
-  for (Evas_Object **slot : slots)
+  for (Evas_Object **slot : _slots(ad))
     if (*slot) {
       evas_object_del(*slot);
       *slot = nullptr;
     }
+}
+
+Evas_Object *tavro_popup_shown(const appdata *ad) {
+  for (Evas_Object *const *slot : _slots(const_cast<appdata *>(ad)))
+    if (*slot && *slot != ad->crash_popup && *slot != ad->crashpopup_win) return *slot;
+  return nullptr;
 }

@@ -1,5 +1,7 @@
 #include "tavro_preferences.h"
 
+#include <cstring>
+
 TavroText tavro_preference_text(const char *key, int *error) {
   char *value = nullptr;
   const int ret = preference_get_string(key, &value);
@@ -19,4 +21,10 @@ bool tavro_preference_flag(const char *key, bool fallback) {
 
 TavroText tavro_get_username_from_preference() {
   return tavro_preference_text(TAVRO_PREF_USERNAME);
+}
+
+bool tavro_is_for_signed_in_user(const char *user_name) {
+  if (!user_name || !*user_name) return true;
+  const TavroText signed_in = tavro_get_username_from_preference();
+  return signed_in && std::strcmp(signed_in.get(), user_name) == 0;
 }

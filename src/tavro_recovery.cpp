@@ -5,6 +5,7 @@
 #include "tavro-common.h"
 #include "tavro-main.h"
 #include "tavro_dbmgr.h"
+#include "tavro_deleted_files.h"
 #include "tavro_handles.h"
 #include "tavro_history_text.h"
 #include "tavro_log.h"
@@ -17,14 +18,15 @@ bool is_prepared = false;
 
 }  // namespace
 
-void tavro_finish_interrupted_save() {
+int tavro_finish_interrupted_save() {
   const int id = tavro_journal_recover();
-  if (id < 1) return;
+  if (id < 1) return id;
   const TavroHandle<svc_voc_data, tavro_dbmgr_free_voc_data> voc(tavro_dbmgr_get_voc_by_id(id));
   TAVRO_LOGD("completed the interrupted save of report %d", id);
   if (voc && tavro_current_status(voc->submitted) == TAVRO_STATUS_SENDING) {
     _tavro_launch_upload_mgr_svc(TAVRO_OPERATION_TYPE_UI, id);
   }
+  return id;
 }
 
 void tavro_prepare_store() {
@@ -32,6 +34,7 @@ void tavro_prepare_store() {
   is_prepared = true;
   if (tavro_dbmgr_ensure_schema() == TAVRO_STORE_UNUSABLE) return;
   tavro_finish_interrupted_save();
+  tavro_deleted_files_remove();  // of a deletion that was cut off
 }
 
 void tavro_tell_store_was_replaced(appdata *ad) {

@@ -6,6 +6,19 @@
 
 #include "tavro_handles.h"
 
+namespace {
+
+template <typename Id>
+Id _id_from_text(const char *text) {
+  if (!text) return 0;
+  Id id = 0;
+  const char *end = text + std::strlen(text);
+  const auto parsed = std::from_chars(text, end, id);
+  return parsed.ec == std::errc() && parsed.ptr == end && id > 0 ? id : 0;
+}
+
+}  // namespace
+
 TavroText tavro_request_text(app_control_h request, const char *key, int *error) {
   char *value = nullptr;
   const int ret = app_control_get_extra_data(request, key, &value);
@@ -27,9 +40,9 @@ std::vector<std::string> tavro_request_texts(app_control_h request, const char *
 }
 
 int tavro_record_id_from_text(const char *text) {
-  if (!text) return 0;
-  int id = 0;
-  const char *end = text + std::strlen(text);
-  const auto parsed = std::from_chars(text, end, id);
-  return parsed.ec == std::errc() && parsed.ptr == end && id > 0 ? id : 0;
+  return _id_from_text<int>(text);
+}
+
+long tavro_server_id_from_text(const char *text) {
+  return _id_from_text<long>(text);
 }

@@ -84,7 +84,6 @@ tavro_review_item _attachment_item(const std::string &path, int number) {
 tavro_review_item _dump_item(const std::string &path) {
   tavro_review_item item = _file_item(TAVRO_REVIEW_DUMP, tavro_text("IDS_OB_BODY_CRASH_DUMP"), path);
   item.detail.insert(0, _name_of(path));
-  item.can_open = false;  // a program's memory is nothing that a person reads
   return item;
 }
 

@@ -10,8 +10,6 @@
 #include "tavro_compose.h"
 #include "tavro_compose_strip.h"
 #include "tavro_device_status.h"
-#include "tavro_handles.h"
-#include "tavro_log_archive.h"
 #include "tavro_review.h"
 #include "tavro_screens.h"
 #include "tavro_widgets.h"
@@ -19,7 +17,6 @@
 namespace {
 
 constexpr double kLogLookSeconds = 0.5;
-constexpr size_t kLogShownBytes = 256 * 1024;
 
 // The one page that can be open; `page` null: none. It goes with the compose screen that it belongs to.
 struct review_page {
@@ -47,22 +44,6 @@ const std::string &_read_device_status() {
   return _review.device_status;
 }
 
-void _open_log(const tavro_review_item &item) {
-  tavro_log_tail tail;
-  if (!tavro_log_archive_read(item.path.c_str(), kLogShownBytes, &tail)) {
-    tavro_popup_show(_review.ad, &_review.ad->history_file_popup,
-                     tavro_text("IDS_OB_HEADER_CANNOT_BE_OPENED"), tavro_text("IDS_OB_BODY_LOG_NOT_READABLE"),
-                     {{tavro_text("IDS_OB_BUTTON_OK"), nullptr}});
-    return;
-  }
-  if (tail.is_cut) {
-    const TavroGText note(
-        g_strdup_printf(tavro_text("IDS_OB_BODY_LOG_LAST_PS"), tavro_size_text(kLogShownBytes).c_str()));
-    tail.text.insert(0, std::string(note.get()) + "\n\n");
-  }
-  tavro_create_text_page(_review.ad, item.title.c_str(), tail.text.c_str(), true);
-}
-
 void _open(const tavro_review_item &item) {
   switch (item.kind) {
     case TAVRO_REVIEW_TEXT:
@@ -71,10 +52,11 @@ void _open(const tavro_review_item &item) {
     case TAVRO_REVIEW_VIDEO:
       return tavro_create_picture_page(_review.ad, item.path.c_str());
     case TAVRO_REVIEW_LOG:
-      return _open_log(item);
+      return tavro_create_log_page(_review.ad, item.title.c_str(), item.path.c_str());
     case TAVRO_REVIEW_DEVICE_STATUS:
       return tavro_create_text_page(_review.ad, item.title.c_str(), _read_device_status().c_str());
     case TAVRO_REVIEW_DUMP:
+      return tavro_compose_dump_open(_review.ad);
     case TAVRO_REVIEW_ACCOUNT:
       return;
   }

@@ -29,6 +29,7 @@ constexpr char kReport[] = "report";
 constexpr char kType[] = "type";
 constexpr char kSubmitted[] = "submitted";
 constexpr char kLastVocId[] = "last_voc_id";
+constexpr char kFollowUpOf[] = "follow_up_of";
 
 template <typename Report>
 struct journal_text {
@@ -43,7 +44,7 @@ constexpr journal_text<problem> kProblemTexts[] = {
     {"severity", &problem::severity},       {"dump_file", &problem::dump_file},
     {"dump_name", &problem::dump_name},     {"syslog_file", &problem::syslog_file},
     {"syslog_name", &problem::syslog_name}, {"device_data_filepath", &problem::device_data_filepath},
-    {"user_name", &problem::user_name},
+    {"user_name", &problem::user_name},     {"follow_up_verdict", &problem::follow_up_verdict},
 };
 
 using idea = tavro_dbmgr_suggestion_info;
@@ -67,6 +68,17 @@ const char *_type(const problem *) {
 const char *_type(const idea *) {
   return TAVRO_DBMGR_SUGGESTION;
 }
+// Only a problem report can be a follow-up.
+int _follow_up_of(const problem *report) {
+  return report->follow_up_of;
+}
+int _follow_up_of(const idea *) {
+  return 0;
+}
+void _set_follow_up_of(problem *report, int server_id) {
+  report->follow_up_of = server_id;
+}
+void _set_follow_up_of(idea *, int) {}
 int _save(problem *report) {
   return tavro_dbmgr_update_bug_report(report);
 }
@@ -131,6 +143,8 @@ int _write(const Report *report) {
   g_key_file_set_string(file.get(), kReport, kType, _type(report));
   g_key_file_set_integer(file.get(), kReport, kSubmitted, report->submitted);
   g_key_file_set_integer(file.get(), kReport, kLastVocId, last_voc_id);
+  if (const int first = _follow_up_of(report))
+    g_key_file_set_integer(file.get(), kReport, kFollowUpOf, first);
   for (const auto &text : _texts(report))
     tavro_note_set_text(file.get(), kReport, text.key, report->*text.member);
   tavro_note_set_attachments(file.get(), kReport, report->attachments);
@@ -149,6 +163,7 @@ template <typename Report>
 std::unique_ptr<Report, report_deleter> _noted_report(GKeyFile *file) {
   std::unique_ptr<Report, report_deleter> report(TAVRO_ZALLOC(Report));
   report->submitted = g_key_file_get_integer(file, kReport, kSubmitted, nullptr);
+  _set_follow_up_of(report.get(), g_key_file_get_integer(file, kReport, kFollowUpOf, nullptr));
   for (const auto &text : _texts(report.get()))
     report.get()->*text.member = tavro_note_text(file, kReport, text.key);
   report->attachments = tavro_note_attachments(file, kReport);

@@ -6,6 +6,7 @@
 
 #include "tavro-common.h"
 #include "tavro_app_control_handle.h"
+#include "tavro_launch_tables.h"
 #include "tavro_log.h"
 
 namespace {
@@ -29,7 +30,7 @@ struct operation_extras {
   extra_data extras[kMostExtras];  // in the order of sending, a null key ends them
 };
 
-// The upload service reads these keys; operations that are not listed carry none.
+// The upload service reads these keys; an operation that is not listed carries none.
 constexpr operation_extras kOperations[] = {
     {TAVRO_SEND_FAILED_VOC, {{"TAVRO_VOC_ID", form::number, nullptr}}},
     {TAVRO_OPERATION_TYPE_UI, {{"TAVRO_VOC_ID", form::number, nullptr}}},
@@ -44,6 +45,13 @@ constexpr operation_extras kOperations[] = {
      {{"TAVRO_BETA_ID", form::long_number, nullptr}, {"TAVRO_BETA_TYPE", form::fixed, "app"}}},
     {TAVRO_OPERATION_TYPE_REGISTER_USER_CLICK,
      {{"TAVRO_CLICK_ITEM_ID", form::number, nullptr}, {"TAVRO_CLICK_ITEM_TYPE", form::fixed, "banner"}}},
+    {TAVRO_OPERATION_TYPE_APP_UPDATE, {}},
+    {TAVRO_OPERATION_TYPE_GET_BANNERS, {}},
+    {TAVRO_OPERATION_TYPE_GET_BETA_URLS, {}},
+    {TAVRO_OPERATION_TYPE_GET_BOARDS_URL, {}},
+    {TAVRO_OPERATION_TYPE_GET_MAX_LIMIT, {}},
+    {TAVRO_OPERATION_TYPE_GET_MODEL_ALIAS_STATUS, {}},
+    {TAVRO_OPERATION_TYPE_GET_USER_BETA_STATUS, {}},
 };
 
 void _add_extra(app_control_h request, const char *key, const char *value) {
@@ -90,7 +98,7 @@ TavroRequest _create_request() {
 }
 
 // A step that fails is logged and the next one still made: the platform refuses what cannot be sent.
-void _address_and_send(app_control_h request, const char *operation, const char *app_id,
+bool _address_and_send(app_control_h request, const char *operation, const char *app_id,
                        const char *sent_message) {
   int ret = app_control_set_operation(request, operation);
   if (ret != APP_CONTROL_ERROR_NONE) {
@@ -103,8 +111,16 @@ void _address_and_send(app_control_h request, const char *operation, const char 
   ret = app_control_send_launch_request(request, nullptr, nullptr);
   if (ret != APP_CONTROL_ERROR_NONE) {
     TAVRO_LOGD("app_control_send_launch_request failed: %d, %s", ret, get_error_message(ret));
-  } else {
-    TAVRO_LOGD("%s", sent_message);
+    return false;
+  }
+  TAVRO_LOGD("%s", sent_message);
+  return true;
+}
+
+void _set_uri(app_control_h request, const char *uri) {
+  const int ret = app_control_set_uri(request, uri);
+  if (ret != APP_CONTROL_ERROR_NONE) {
+    TAVRO_LOGD("app_control_set_uri failed: %d, %s", ret, get_error_message(ret));
   }
 }
 
@@ -139,26 +155,35 @@ void _tavro_send_beta_click_event_to_svc(const char *item_kind, long item_id) {
                     "Service launched for beta click event");
 }
 
-void _tavro_launch_app_store(const char *uri) {
+bool _tavro_launch_app_store(const char *uri) {
   const TavroRequest request = _create_request();
-  if (!request) return;
-  const int ret = app_control_set_uri(request.get(), uri);
-  if (ret != APP_CONTROL_ERROR_NONE) {
-    TAVRO_LOGD("app_control_set_uri failed: %d, %s", ret, get_error_message(ret));
-  }
-  _address_and_send(request.get(), APP_CONTROL_OPERATION_VIEW, kAppStoreId, "App Store launched");
+  if (!request) return false;
+  _set_uri(request.get(), uri);
+  return _address_and_send(request.get(), APP_CONTROL_OPERATION_VIEW, kAppStoreId, "App Store launched");
 }
 
-void tavro_launch_browser(const char *uri) {
+bool tavro_launch_browser(const char *uri) {
   int ret = APP_CONTROL_ERROR_NONE;
   const TavroRequest request = tavro_request_create(&ret);
   if (!request) {
     TAVRO_LOGD("Failed to create appcontrol");
-    return;
+    return false;
   }
   app_control_set_operation(request.get(), APP_CONTROL_OPERATION_VIEW);
   app_control_set_app_id(request.get(), kBrowserId);
-  app_control_set_uri(request.get(), uri);
+  _set_uri(request.get(), uri);
   ret = app_control_send_launch_request(request.get(), nullptr, nullptr);
   if (ret != APP_CONTROL_ERROR_NONE) TAVRO_LOGD("Failed to launch request");
+  return ret == APP_CONTROL_ERROR_NONE;
+}
+
+std::vector<tavro_sent_operation> tavro_sent_operations() {
+  std::vector<tavro_sent_operation> all;
+  for (const operation_extras &entry : kOperations) {
+    all.push_back({entry.operation, {}});
+    for (const extra_data &extra : entry.extras) {
+      if (extra.key) all.back().keys.push_back(extra.key);
+    }
+  }
+  return all;
 }

@@ -7,11 +7,13 @@
 #include "tavro-main.h"
 #include "tavro_appdata.h"
 #include "tavro_dbmgr.h"
+#include "tavro_follow_up.h"
 #include "tavro_log.h"
 #include "tavro_memory.h"
 #include "tavro_notifications.h"
 #include "tavro_preferences.h"
 #include "tavro_push_handlers.h"
+#include "tavro_report_delete.h"
 #include "tavro_report_files.h"
 #include "tavro_request.h"
 #include "tavro_screens.h"
@@ -45,8 +47,15 @@ TavroText _read_user_name() {
   return user_name;
 }
 
+void _take_community_replies(app_control_h service, appdata *ad) {
+  const TavroText replies = _read_event(service, TAVRO_COMM_PUSH, "community_replies");
+  if (_equals(replies, TAVRO_PUSH_NUM_REPLIES)) tavro_handle_community_replies(ad);
+}
+
 // False when the client must be replaced first: the rest of the request is then left alone.
-bool _check_version(appdata *ad) {
+bool _take_version(app_control_h service, appdata *ad) {
+  const TavroText version = _read_event(service, TAVRO_APP_UPDATE_STATUS, "version_updated");
+  if (!version) return true;
   const int update = check_version_update(ad);
   TAVRO_LOGD("ret value :%d", update);
   if (update != TAVRO_UPDATE_MANDATORY) return true;
@@ -54,9 +63,32 @@ bool _check_version(appdata *ad) {
   return false;
 }
 
+void _take_upload_result(app_control_h service, appdata *ad) {
+  const TavroText status = _read_event(service, TAVRO_SERVER_UPLOAD_STATUS, "upload_status");
+  if (status) tavro_handle_upload_status(service, ad, status.get());
+}
+
+void _take_push_replies(app_control_h service, appdata *ad) {
+  const TavroText status = _read_event(service, TAVRO_SERVER_PUSH_NOTI_STATUS, "push_noti_status");
+  if (!_equals(status, TAVRO_SERVER_PUSH_NOTI_UPDATED)) return;
+  tavro_handle_badge_notifications(service, ad);
+  tavro_handle_push_notifications(service, ad);
+}
+
 void _refresh_screens(app_control_h service, appdata *ad, int voc_id) {
   tavro_update_history_page(service, ad);
   if (voc_id > 0) tavro_update_history_details_page(ad, voc_id);
+}
+
+// A report whose deletion waits is gone for the person, and nothing is told about it.
+bool _is_hidden(int voc_id) {
+  return voc_id > 0 && tavro_delete_is_waiting(voc_id);
+}
+
+// Reports of whoever used the phone before are sent, and answered, after they signed out.
+bool _is_of_another(int voc_id) {
+  const TavroVoc voc(voc_id > 0 ? tavro_dbmgr_get_voc_by_id(voc_id) : nullptr);
+  return voc && !tavro_is_for_signed_in_user(voc->user_name);
 }
 
 void _upload_succeeded(appdata *ad, int voc_id, const char *description, const char *user_name) {
@@ -66,34 +98,26 @@ void _upload_succeeded(appdata *ad, int voc_id, const char *description, const c
     tavro_delete_dump_file(voc_id);
     tavro_delete_syslog_file(voc_id);
   }
-  if (user_name) tavro_create_notification(tavro_text("IDS_OB_MBODY_FEEDBACK_SENT"), description, ad);
+  if (user_name && !_is_hidden(voc_id) && !_is_of_another(voc_id))
+    tavro_create_notification(tavro_text("IDS_OB_MBODY_FEEDBACK_SENT"), description, ad);
   if (!ad->win) tavro_request_exit(ad);
 }
 
-void _upload_failed(appdata *ad, const char *description, const char *user_name) {
-  if (!user_name) return;
+void _upload_failed(appdata *ad, int voc_id, const char *description, const char *user_name) {
+  if (!user_name || _is_hidden(voc_id)) return;
   TAVRO_LOGD("launch error popup");
   tavro_create_server_connection_fail_popup(ad);
-  tavro_create_notification(tavro_text("IDS_OB_TMBODY_SENDING_FAILED"), description, ad);
+  if (!_is_of_another(voc_id))
+    tavro_create_notification(tavro_text("IDS_OB_TMBODY_SENDING_FAILED"), description, ad);
 }
 
 }  // namespace
 
 void tavro_handle_service_updates(app_control_h service, appdata *ad) {
-  const TavroText replies = _read_event(service, TAVRO_COMM_PUSH, "community_replies");
-  if (_equals(replies, TAVRO_PUSH_NUM_REPLIES)) tavro_handle_community_replies(ad);
-
-  const TavroText version = _read_event(service, TAVRO_APP_UPDATE_STATUS, "version_updated");
-  if (version && !_check_version(ad)) return;
-
-  const TavroText upload_status = _read_event(service, TAVRO_SERVER_UPLOAD_STATUS, "upload_status");
-  if (upload_status) tavro_handle_upload_status(service, ad, upload_status.get());
-
-  const TavroText push_status = _read_event(service, TAVRO_SERVER_PUSH_NOTI_STATUS, "push_noti_status");
-  if (_equals(push_status, TAVRO_SERVER_PUSH_NOTI_UPDATED)) {
-    tavro_handle_badge_notifications(service, ad);
-    tavro_handle_push_notifications(service, ad);
-  }
+  _take_community_replies(service, ad);
+  if (!_take_version(service, ad)) return;
+  _take_upload_result(service, ad);
+  _take_push_replies(service, ad);
 }
 
 void tavro_handle_upload_status(app_control_h service, appdata *ad, const char *upload_status) {
@@ -109,7 +133,7 @@ void tavro_handle_upload_status(app_control_h service, appdata *ad, const char *
   if (std::strcmp(upload_status, TAVRO_SERVER_UPLOAD_SUCCESS) == 0) {
     _upload_succeeded(ad, voc_id, description.get(), user_name.get());
   } else if (std::strcmp(upload_status, TAVRO_SERVER_UPLOAD_FAIL) == 0) {
-    _upload_failed(ad, description.get(), user_name.get());
+    _upload_failed(ad, voc_id, description.get(), user_name.get());
   } else {
     return;
   }
@@ -130,7 +154,8 @@ void tavro_handle_badge_notifications(app_control_h service, appdata *ad) {
     tavro_create_noti_badge_on_appicon(ad->push_noti_count);
   }
   const TavroText id_text = tavro_request_text(service, TAVRO_SERVER_PUSH_NOTI_VOC_ID);
-  tavro_create_push_notification(reply.get(), tavro_record_id_from_text(id_text.get()));
+  const int voc_id = tavro_record_id_from_text(id_text.get());
+  if (!_is_hidden(voc_id) && !_is_of_another(voc_id)) tavro_create_push_notification(reply.get(), voc_id);
   if (ad->layout) {
     tavro_update_landing_page_history_badge(ad);
   } else {

@@ -3,6 +3,7 @@
 #include <cstring>
 
 #include "tavro-common.h"
+#include "tavro_focus.h"
 #include "tavro_targets.h"
 #include "tavro_widgets.h"
 
@@ -19,23 +20,23 @@ void _picture_failed_cb(void *data, Evas_Object *, void *) {
   elm_object_signal_emit(static_cast<Evas_Object *>(data), "tavro,unreadable", "tavro");
 }
 
-// Other people's pictures may not be readable: then the tile shows.
-Evas_Object *_application_icon(Evas_Object *list, const tavro_target_row *row) {
-  Evas_Object *frame = tavro_layout_add(list, "tavro/app_icon");
-  Evas_Object *picture = tavro_picture_add(frame, row->icon.c_str(), kIconUnits);
-  evas_object_smart_callback_add(picture, "load,error", _picture_failed_cb, frame);
-  elm_object_content_set(frame, picture);
-  return frame;
-}
-
 Evas_Object *_row_content(void *data, Evas_Object *list, const char *part) {
   const auto *row = static_cast<tavro_target_row *>(data);
   if (std::strcmp(part, "elm.swallow.end") == 0)
     return row->has_page ? tavro_icon_add(list, "chevron") : nullptr;
-  return row->icon.empty() ? tavro_tile_add(list, row->tile) : _application_icon(list, row);
+  return row->icon.empty() ? tavro_tile_add(list, row->tile)
+                           : tavro_application_icon_add(list, row->icon.c_str());
 }
 
 }  // namespace
+
+Evas_Object *tavro_application_icon_add(Evas_Object *parent, const char *path) {
+  Evas_Object *frame = tavro_layout_add(parent, "tavro/app_icon");
+  Evas_Object *picture = tavro_picture_add(frame, path, kIconUnits);
+  evas_object_smart_callback_add(picture, "load,error", _picture_failed_cb, frame);
+  elm_object_content_set(frame, picture);
+  return frame;
+}
 
 tavro_target_row tavro_target_row_of(const tavro_target_category &category) {
   const char *text = tavro_text(category.text);
@@ -55,6 +56,7 @@ Evas_Object *tavro_target_list_add(Evas_Object *parent) {
   elm_genlist_homogeneous_set(list, EINA_TRUE);  // within a style; saves laying out every row
   elm_genlist_select_mode_set(list, ELM_OBJECT_SELECT_MODE_ALWAYS);
   elm_scroller_policy_set(list, ELM_SCROLLER_POLICY_OFF, ELM_SCROLLER_POLICY_OFF);
+  tavro_focus_walk_list(list);
   evas_object_show(list);
   return list;
 }

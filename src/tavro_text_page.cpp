@@ -10,6 +10,7 @@
 #include "tavro-common.h"
 #include "tavro-main.h"
 #include "tavro_handles.h"
+#include "tavro_log_archive.h"
 #include "tavro_memory.h"
 #include "tavro_screens.h"
 #include "tavro_text_parts.h"
@@ -18,6 +19,7 @@
 namespace {
 
 constexpr size_t kPartBytes = 8 * 1024;
+constexpr size_t kLogShownBytes = 256 * 1024;
 
 // Belongs to its page.
 struct text_page {
@@ -131,4 +133,19 @@ void tavro_create_text_page(appdata *ad, const char *title, const char *text, bo
   if (tavro_text_parts(state->text, kPartBytes).size() > 1) _build_bottom(state);
   _show_part(state, 0);
   tavro_page_push(ad, state->page, title);
+}
+
+void tavro_create_log_page(appdata *ad, const char *title, const char *path) {
+  tavro_log_tail tail;
+  if (!tavro_log_archive_read(path, kLogShownBytes, &tail)) {
+    tavro_popup_show(ad, &ad->history_file_popup, tavro_text("IDS_OB_HEADER_CANNOT_BE_OPENED"),
+                     tavro_text("IDS_OB_BODY_LOG_NOT_READABLE"), {{tavro_text("IDS_OB_BUTTON_OK"), nullptr}});
+    return;
+  }
+  if (tail.is_cut) {
+    const TavroGText note(
+        g_strdup_printf(tavro_text("IDS_OB_BODY_LOG_LAST_PS"), tavro_size_text(kLogShownBytes).c_str()));
+    tail.text.insert(0, std::string(note.get()) + "\n\n");
+  }
+  tavro_create_text_page(ad, title, tail.text.c_str(), true);
 }

@@ -14,6 +14,7 @@
 #include "tavro_handles.h"
 #include "tavro_memory.h"
 #include "tavro_picture_info.h"
+#include "tavro_save_copy.h"
 #include "tavro_screens.h"
 #include "tavro_widgets.h"
 
@@ -211,6 +212,10 @@ void _build_video(viewer *state, const char *name) {
   elm_object_content_set(state->page, tile);
 }
 
+void _save_clicked_cb(void *data, Evas_Object *, void *) {
+  tavro_save_copy(static_cast<const viewer *>(data)->path);
+}
+
 void _build_bar(viewer *state, const char *name) {
   elm_object_part_text_set(state->page, "elm.text.title", name);
   Evas_Object *back =
@@ -221,7 +226,7 @@ void _build_bar(viewer *state, const char *name) {
 
 }  // namespace
 
-void tavro_create_picture_page(appdata *ad, const char *path) {
+void tavro_create_picture_page(appdata *ad, const char *path, bool can_save) {
   if (!ad->nf) return;
   const char *slash = std::strrchr(path, '/');
   const char *name = slash ? slash + 1 : path;
@@ -236,5 +241,9 @@ void tavro_create_picture_page(appdata *ad, const char *path) {
     _build_video(state, name);
   else
     _build_picture(state, name);
+  if (can_save) {
+    const char *label = tavro_text("IDS_OB_BUTTON_SAVE_COPY");
+    tavro_page_action_add(state->page, "save", label, _save_clicked_cb, state);
+  }
   tavro_page_push(ad, state->page, name);
 }

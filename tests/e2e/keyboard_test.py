@@ -65,6 +65,13 @@ class Keyboard(Road):
         self.press(key)
         return wait_until(lambda: self.focused() not in (None, before) and self.focused(), what=f"{key} moving the focus")
 
+    def walk_to(self, name, key="Tab"):
+        for _ in range(40):
+            if self.focused().get_name() == name:
+                return
+            self.move(key)
+        raise AssertionError(f"{key} never leads to '{name}'")
+
     def go_round(self, key="Tab"):
         """Where the key takes the focus, from one control on until it is there again."""
         stops = [self.focused()]
@@ -123,8 +130,7 @@ def assert_reading_order(keyboard):
 def test_the_account_is_chosen_with_keys(keyboard):
     assert_reading_order(keyboard)
     keyboard.focus_is_on(keyboard.focused().get_name())
-    while keyboard.focused().get_name() != "Continue":
-        keyboard.move("Tab")
+    keyboard.walk_to("Continue")
     keyboard.press("space")
     keyboard.focus_is_on("Report a problem")
     assert assert_reading_order(keyboard) == ["Report a problem", "Share an idea", "My Reports"]
@@ -139,8 +145,7 @@ def test_the_ring_is_shown_at_a_key_and_not_at_a_touch(keyboard, tmp_path):
 
     def touch_nothing():
         keyboard.screen.atspi.generate_mouse_event(300, 1200, "b1c")
-    while keyboard.focused().get_name() != "Share an idea":
-        keyboard.move("Tab")
+    keyboard.walk_to("Share an idea")
     with_ring = picture()
     touch_nothing()
     wait_until(lambda: picture() != with_ring, what="the ring going at a touch")
@@ -151,8 +156,7 @@ def test_the_ring_is_shown_at_a_key_and_not_at_a_touch(keyboard, tmp_path):
 
 @pytest.mark.parametrize("page, is_writing", [("Report a problem", True), ("Share an idea", True), ("My Reports", False)])
 def test_a_page_opens_with_enter_and_leads_back_to_where_it_was_opened(keyboard, page, is_writing):
-    while keyboard.focused().get_name() != page:
-        keyboard.move("Tab")
+    keyboard.walk_to(page)
     keyboard.press("Return")
     keyboard.focus_is_on("Title" if is_writing else "Back")
     if is_writing:
@@ -164,8 +168,7 @@ def test_a_page_opens_with_enter_and_leads_back_to_where_it_was_opened(keyboard,
 
 
 def test_text_goes_into_the_field_and_tab_leads_on_instead_of_into_the_text(keyboard):
-    while keyboard.focused().get_name() != "Report a problem":
-        keyboard.move("Tab")
+    keyboard.walk_to("Report a problem")
     keyboard.press("Return")
     keyboard.focus_is_on("Title")
     keyboard.press("Shift_L+h", "e", "l", "l", "o", "Tab", "a", "space", "b")
@@ -186,12 +189,10 @@ def test_a_popup_keeps_the_focus_and_gives_it_back(keyboard):
 
 
 def test_a_list_is_walked_with_the_arrows_and_chosen_from_with_enter(keyboard):
-    while keyboard.focused().get_name() != "About: Choose what it is about":
-        keyboard.move("Shift_L+Tab")
+    keyboard.walk_to("About: Choose what it is about", "Shift_L+Tab")
     keyboard.press("Return")
     keyboard.focus_is_on("Back")
-    while keyboard.focused().get_name() != "Battery":
-        keyboard.move("Tab")
+    keyboard.walk_to("Battery")
     assert keyboard.move("Down").get_name() == "Hardware"
     keyboard.press("Return")
     keyboard.screen.wait_for("About: Hardware")

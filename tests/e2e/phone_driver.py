@@ -120,8 +120,11 @@ class Screen:
         """All visible nodes, parents first; nodes that vanish while we look are skipped."""
         from gi.repository import GLib
         desktop = self.atspi.get_desktop(0)
-        desktop.set_cache_mask(self.atspi.Cache.NONE)  # what is shown now, not what once was
         pending = [desktop.get_child_at_index(i) for i in range(desktop.get_child_count())]
+        # What is shown now, not what once was: of each application, since not all take it over from the desktop.
+        for node in filter(None, [desktop, *pending]):
+            node.set_cache_mask(self.atspi.Cache.NONE)
+            node.clear_cache()
         while pending:
             node = pending.pop(0)
             try:

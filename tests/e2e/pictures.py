@@ -1,15 +1,23 @@
-"""Pictures of the screens of reporting, in both palettes and at each size: what docs/pictures/ shows."""
+"""Pictures of the screens, in both palettes and at each size: what docs/pictures/ shows."""
 
 import pathlib
 import subprocess
 import sys
 
+import stored_reports as stored
 from phone_driver import ROOT, Phone, wait_until
-from road import Road
+from road import IN_PROCESS, Road
 
 TITLE = "Thumbnails stay grey after update"
 TEXT = "Since this morning's update the album view shows grey boxes. Opening a picture and going back mends that one only."
 IDEA = "Swipe to undo in Notes"
+ANSWERED = "Charging stops at 80 percent"
+SOLVED = 3
+NOT_SENT = "0"  # Nothing tries again by itself.
+FAILED = "Map is cut off at the right"
+HOUR = 3600
+CRASHED = {"operation": "CRASH_PROCESS", "TAVRO_CRASH_APP_ID": "org.example.mail", "TAVRO_CRASH_APP_NAME": "Mail",
+           "TAVRO_CRASH_FOLDER": "mail_17_aa"}
 VARIANTS = [(size, theme) for size in ("720x1280", "480x800", "1280x720", "800x480") for theme in ("light", "dark")]
 
 
@@ -82,6 +90,71 @@ class Pictures:
         road.screen.wait_for("Report a problem")
         road.write_idea("Network", IDEA, "Two fingers to the left take back what was typed last.")
         self.take(road.phone, "idea")
+        road.back()
+        road.screen.activate("Discard")
+        road.screen.wait_for("Report a problem")
+
+    def history(self, road):
+        stored.remove_all_reports(road.phone)
+        road.open_history()
+        road.screen.wait_for("Write a report")
+        self.take(road.phone, "history-empty")
+        stored.add_report(road.phone, FAILED, NOT_SENT, "Browser", "The right third stays white.", age=HOUR)
+        stored.add_report(road.phone, IDEA, stored.DRAFT, "Network", "Two fingers.", stored.IDEA, age=2 * HOUR)
+        stored.add_report(road.phone, "Loud click after a call", stored.COMPLETED, "Phone", "It clicks.", age=3 * HOUR)
+        stored.add_report(road.phone, "Camera stopped", stored.SUBMITTED, "Camera", "I took a picture.", age=4 * HOUR,
+                          dump="/opt/usr/media/Orbel/tavro_aa.zip")
+        road.back()
+        road.write_problem("Battery", ANSWERED, "It stays at 80 percent overnight, with any charger.")
+        road.send()
+        number = road.arrived(ANSWERED)["id"]
+        road.desk.answer(number, IN_PROCESS, "Thank you. Is the option that spares the battery switched on?")
+        road.open_history()
+        road.screen.wait_for(road.wait_for_row(ANSWERED, "New reply"))
+        self.take(road.phone, "history")
+        road.screen.activate(road.wait_for_row(ANSWERED))
+        road.screen.wait_for("Status: In process")
+        self.take(road.phone, "details")
+        road.desk.answer(number, SOLVED, "Version 2.1 mends this.")
+        road.screen.wait_for("Status: Completed", timeout=20)
+        road.screen.activate("Still happens")
+        road.screen.wait_for("What do you still see? (optional)")
+        self.take(road.phone, "follow-up")
+        road.back()
+        road.back()
+        road.screen.activate(road.wait_for_row(FAILED))
+        road.screen.wait_for("Status: Sending failed")
+        self.take(road.phone, "details-failed")
+        road.back()
+
+    def deleting(self, road):
+        road.screen.activate("More")
+        road.screen.activate("Select")
+        road.screen.wait_for("Select items")
+        for title in (ANSWERED, FAILED):
+            road.screen.activate(road.wait_for_row(title))
+        road.screen.wait_for("Select items (2)")
+        self.take(road.phone, "history-select")
+        road.screen.activate("Delete")
+        road.screen.wait_for("Delete 2 reports?")
+        road.phone.execute("xdotool", "key", "Return")
+        road.screen.wait_for("Undo")
+        road.screen.wait_for("More")
+        self.take(road.phone, "undo")
+        road.screen.wait_gone("Undo", timeout=30)
+        road.back()
+
+    def crash(self, road):
+        folder = road.phone.storage() / "share/crash/dump" / CRASHED["TAVRO_CRASH_FOLDER"]
+        folder.mkdir(parents=True)
+        (folder / "core.coredump.gz").write_bytes(bytes(range(256)) * 800)
+        (folder / "app.cs").write_text("Application: org.example.mail\nSignal: 11 (SIGSEGV)\n#0 play_next (player.c:40)\n")
+        road.phone.launch(**CRASHED)
+        road.screen.wait_for("Mail stopped")
+        self.take(road.phone, "crash-question")
+        road.screen.activate("Report")
+        road.screen.type_text("What were you doing when it stopped?", "I opened a letter with many pictures.")
+        self.take(road.phone, "crash-report")
 
     def play(self):
         with Phone() as phone:
@@ -94,6 +167,9 @@ class Pictures:
             self.problem(road)
             self.what_is_sent(road)
             self.leaving(road)
+            self.history(road)
+            self.deleting(road)
+            self.crash(road)
 
 
 if __name__ == "__main__":

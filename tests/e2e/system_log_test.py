@@ -53,7 +53,6 @@ def wait_for_description(road, text):
 
 
 def test_a_log_that_is_switched_on_reaches_the_desk_and_is_then_deleted(road):
-    assert CRASH_SERVICE not in road.phone.status()
     road.write_problem(TARGET, "With log", "Look at what the phone wrote")
     assert logs(road) == []
     road.screen.activate("System log")

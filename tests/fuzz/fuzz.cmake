@@ -1,12 +1,16 @@
-# The fuzz target: driven by libFuzzer in the preset "fuzz", else by its seeds alone, as a test.
-add_executable(store_fuzz fuzz/store_fuzz.cpp)
-target_link_libraries(store_fuzz PRIVATE tavro_client tavro_options)
-set_target_properties(store_fuzz PROPERTIES RUNTIME_OUTPUT_DIRECTORY ${CMAKE_BINARY_DIR}/tests)
-if(TAVRO_FUZZ)
-  target_link_options(store_fuzz PRIVATE -fsanitize=fuzzer)
-else()
-  target_sources(store_fuzz PRIVATE fuzz/replay_main.cpp)
-  add_test(NAME store_fuzz_seeds COMMAND
-    ${PROJECT_SOURCE_DIR}/tests/support/in_phone $<TARGET_FILE:store_fuzz>
-    ${PROJECT_SOURCE_DIR}/tests/fuzz/seeds)
-endif()
+# The fuzz targets: driven by libFuzzer in the preset "fuzz", else by their seeds alone, as tests.
+function(tavro_fuzz_target name seeds)
+  add_executable(${name} fuzz/${name}.cpp)
+  target_include_directories(${name} PRIVATE ${PROJECT_SOURCE_DIR}/src)
+  target_link_libraries(${name} PRIVATE tavro_client tavro_options)
+  set_target_properties(${name} PROPERTIES RUNTIME_OUTPUT_DIRECTORY ${CMAKE_BINARY_DIR}/tests)
+  if(TAVRO_FUZZ)
+    target_link_options(${name} PRIVATE -fsanitize=fuzzer)
+  else()
+    target_sources(${name} PRIVATE fuzz/replay_main.cpp)
+    add_test(NAME ${name}_seeds COMMAND
+      ${PROJECT_SOURCE_DIR}/tests/support/in_phone $<TARGET_FILE:${name}> ${PROJECT_SOURCE_DIR}/tests/fuzz/${seeds})
+  endif()
+endfunction()
+tavro_fuzz_target(store_fuzz seeds)
+tavro_fuzz_target(history_fuzz history_seeds)

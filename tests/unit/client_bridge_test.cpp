@@ -43,6 +43,40 @@ TEST_F(Bridge, EveryOperationCarriesItsKeysInOrder) {
   }
 }
 
+TEST_F(Bridge, AClickIsToldWithItsKindWhenThatIsKnown) {
+  const std::string click =
+      kDefault + std::string("TAVRO_OPERATION_TYPE=TAVRO_OPERATION_TYPE_REGISTER_USER_CLICK");
+  const std::pair<const char *, std::string> kinds[] = {
+      {"general", " TAVRO_CLICK_ITEM_ID=-9000000000 TAVRO_CLICK_ITEM_TYPE=general"},
+      {"banner", " TAVRO_CLICK_ITEM_ID=-9000000000 TAVRO_CLICK_ITEM_TYPE=banner"},
+      {"other", ""},
+      {nullptr, ""}};
+  for (const auto &[kind, extras] : kinds) {
+    _tavro_send_beta_click_event_to_svc(kind, -9000000000);
+    EXPECT_THAT(Listener::get().take(), ElementsAre(click + extras));
+  }
+}
+
+TEST_F(Bridge, AnAddressIsOpenedByThePhonesApplicationOrTheMachinesForItsScheme) {
+  EXPECT_TRUE(_tavro_launch_app_store("tizenstore://ProductDetail/x"));
+  EXPECT_THAT(Listener::get().take(),
+              ElementsAre("/org/tizen/tizenstore http://tizen.org/appcontrol/operation/view "
+                          "tizenstore://ProductDetail/x"));
+  EXPECT_FALSE(tavro_launch_browser("gopher://nobody"));
+  EXPECT_FALSE(tavro_launch_browser(nullptr));
+  const std::string visited = std::string(getenv("TMPDIR")) + "/data/visited";
+  const std::string address = "https://forum.example/a?b=1&c='$(d)'";
+  EXPECT_TRUE(tavro_launch_browser(address.c_str()));
+  TavroGText contents;
+  for (int i = 0; i < 3000 && !contents; i++) {
+    char *read = nullptr;
+    g_usleep(10000);
+    if (g_file_get_contents(visited.c_str(), &read, nullptr, nullptr)) contents.reset(read);
+  }
+  ASSERT_NE(contents, nullptr);
+  EXPECT_EQ(contents.get(), address);
+}
+
 TEST_F(Bridge, TheCrashServiceGetsOneWayCallsAndAWrongBodyIsRefused) {
   const char *const parameters[] = {"2", "none", "none"};
   const auto call = [&](const char *method, const char *signature) {

@@ -259,6 +259,22 @@ TEST_F(Drafts, ALowBatterySavesACopyAndTheScreenStaysOpen) {
   EXPECT_THAT(Listener::get().take(), IsEmpty());
 }
 
+TEST_F(Drafts, AnotherReportThatIsSentLeavesTheScreensNotedCopyAlone) {
+  open_problem("", "hours of work");
+  block_store("INSERT ON TABLE_VOC");
+  battery(15);
+  const TavroHandle<tavro_dbmgr_bug_report_info, tavro_free_bug_report> report(
+      TAVRO_ZALLOC(tavro_dbmgr_bug_report_info));
+  report->description = TAVRO_STRDUP("a follow-up");
+  EXPECT_LT(tavro_send_report(&ad, report.get()), 1);
+  unblock_store("INSERT ON TABLE_VOC");
+  const int id = tavro_send_report(&ad, report.get());
+  EXPECT_EQ(column(id, "VOC_TEXT"), "a follow-up");
+  EXPECT_EQ(column(ad.auto_saved_id, "VOC_STATE || VOC_TEXT"), "6hours of work");
+  ASSERT_GE(tavro_send_compose_data(&ad), 1);
+  EXPECT_EQ(row_count("TABLE_VOC"), 2) << "the copy went with its screen";
+}
+
 TEST_F(Drafts, WhatIsOnAScreenWhenTheApplicationIsEndedBecomesADraft) {
   ad.id_to_delete = store_report("older text", 6);
   open_idea();

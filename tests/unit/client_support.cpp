@@ -12,6 +12,8 @@
 #include "tavro-common.h"
 #include "tavro_appcontrol_util.h"
 #include "tavro_appdata.h"
+#include "tavro_crash_popup.h"
+#include "tavro_crash_report.h"
 #include "tavro_dbmgr.h"
 #include "tavro_memory.h"
 #include "tavro_notifications.h"
@@ -19,6 +21,7 @@
 #include "tavro_screens.h"
 #include "tavro_service_bridge.h"
 #include "tavro_share.h"
+#include "tavro_undo_bar.h"
 
 std::vector<std::string> ui_calls;
 
@@ -36,6 +39,12 @@ class World : public ::testing::Environment {
     std::filesystem::create_directories(data_home + "/applications");
     std::ofstream(data_home + "/applications/client_test.desktop")
         << "[Desktop Entry]\nType=Application\nName=Test\nExec=/bin/true\nX-Tavro-Version=1.0.0\n";
+    // The machine's browser notes where it was sent.
+    std::ofstream(data_home + "/applications/browser.desktop")
+        << "[Desktop Entry]\nType=Application\nName=Browser\nExec=sh -c 'printf %%s \"$0\" >" << data_home
+        << "/visited.new && mv " << data_home << "/visited.new " << data_home << "/visited' %u\n";
+    std::ofstream(data_home + "/applications/mimeapps.list")
+        << "[Default Applications]\nx-scheme-handler/https=browser.desktop\n";
     Listener::get();
     elm_init(0, nullptr);
     tavro_dbmgr_init_semaphore();
@@ -270,6 +279,8 @@ RECORD(tavro_refresh_account_page_items(appdata *), "refresh accounts")
 void tavro_create_account_page(appdata *ad) {
   push_page(ad, "account");
 }
+RECORD(tavro_account_page_say(appdata *, const char *text), std::string("account says ") + text)
+void tavro_delete_all_popup(appdata *) {}
 RECORD(tavro_pop_naviframe_middle_items(appdata *), "pop")
 RECORD(tavro_update_landing_page_history_badge(appdata *ad), "badge " + std::to_string(ad->push_noti_count))
 RECORD(tavro_create_history_page(appdata *), "history")
@@ -277,4 +288,29 @@ RECORD(tavro_update_history_page(app_control_h, appdata *), "update history")
 RECORD(tavro_create_history_details_page(appdata *, int id), "details " + std::to_string(id))
 RECORD(tavro_update_history_details_page(appdata *, int id), "update details " + std::to_string(id))
 void tavro_attach_shared_files(app_control_h, appdata *) {}
+RECORD(tavro_handle_crash_event(app_control_h, appdata *), "crash")
+void tavro_crash_report_at_end() {}
 void tavro_compose_keeper_offer(appdata *) {}
+RECORD(tavro_undo_bar_show(appdata *, const char *text, void (*)(appdata *)), std::string("undo bar ") + text)
+void tavro_undo_bar_hide() {}
+bool tavro_leave_compose_page(appdata *) {
+  ui_calls.push_back("leave compose");
+  return true;
+}
+RECORD(tavro_create_crash_page(appdata *, const tavro_crash_report &), "crash report")
+Evas_Object *tavro_popup_shown(const appdata *) {
+  return nullptr;
+}
+Evas_Object *tavro_crash_popup_ask(appdata *ad, const tavro_crash_question &question, tavro_crash_action,
+                                   tavro_crash_action) {
+  return tavro_popup_show(ad, &ad->crash_popup, question.app_name.c_str(), nullptr, {});
+}
+Evas_Object *tavro_crash_popup_progress(appdata *, const std::string &) {
+  return nullptr;
+}
+Evas_Object *tavro_crash_popup_never(appdata *, const std::string &, tavro_crash_action) {
+  return nullptr;
+}
+void tavro_crash_popup_count(appdata *, int) {}
+void tavro_crash_ground_show(appdata *) {}
+void tavro_crash_ground_hide() {}

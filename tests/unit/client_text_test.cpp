@@ -59,6 +59,35 @@ TEST(HistoryText, TheLastStatusDecidesTextAndColour) {
   }
 }
 
+TEST(HistoryText, OddStatusesAndTimesMakeASaneRow) {
+  const std::string many = std::string(20000, '#') + "5";
+  const std::pair<std::string, int> statuses[] = {
+      {"", 0},    {"#", 0}, {"6#", 6}, {"1#2##", 2}, {"abc", 0}, {"99999999999", -1}, {"4294967297", -1},
+      {"-1", -1}, {many, 5}};
+  for (const auto &[submitted, status] : statuses) EXPECT_EQ(tavro_current_status(submitted.c_str()), status);
+  char **tokens = nullptr;
+  int count = -1;
+  tavro_parse_status_string(many.c_str(), &tokens, &count);
+  EXPECT_EQ(count, 20000);
+  EXPECT_STREQ(tokens[count], "5");
+  const TavroStrv first(tokens);
+  tavro_parse_status_string(nullptr, &tokens, &count);
+  EXPECT_EQ(count, 0);
+  EXPECT_EQ(tokens, first.get()) << "left as it was";
+  setenv("TZ", "UTC", 1);
+  const std::pair<const char *, const char *> times[] = {{"0", "01/01/1970"},
+                                                         {"4102444800000#1", "01/01/2100"},
+                                                         {"253402300799999", "31/12/9999"},
+                                                         {"253402300800000", ""},
+                                                         {"-5", ""},
+                                                         {"18446744073709551615", ""},
+                                                         {"99999999999999999999", ""},
+                                                         {"abc", ""},
+                                                         {"", ""},
+                                                         {"1425513600000x", "05/03/2015"}};
+  for (const auto &[stored, shown] : times) EXPECT_EQ(tavro_shown_time(stored), shown) << stored;
+}
+
 TEST(HistoryText, NothingThatWasTypedBecomesMarkup) {
   char title[] = "";
   char description[] = "a <b>bold</b> & long story";

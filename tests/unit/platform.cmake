@@ -12,6 +12,7 @@ tavro_unit_test(platform_test
   SOURCES unit/platform_launch_test.cpp unit/platform_log_test.cpp unit/platform_preference_test.cpp
           unit/platform_services_test.cpp
   LIBS tavro_platform)
+target_include_directories(platform_test PRIVATE ${PROJECT_SOURCE_DIR}/platform/linux)
 target_compile_definitions(platform_test PRIVATE TAVRO_SAMPLE_APPS="${sample_apps}")
 add_dependencies(platform_test test.sample-service test.window)
 
