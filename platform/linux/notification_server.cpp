@@ -15,6 +15,7 @@ namespace platform {
 namespace {
 
 constexpr int kCallTimeoutMs = 10'000;
+constexpr guint kSuccessorMs = 100;  // within which what is closed may be replaced by something new
 
 // A notification as the service knows it.
 struct Shown {
@@ -30,6 +31,8 @@ struct Waiting {
 struct Queue {
   std::deque<Waiting> steps;
   bool is_busy = false;       // the service is being asked for the first step
+  guint successor_timer = 0;  // the first step closes something, and waits for what may follow it
+  bool has_waited = false;
   Shown inherited = {"", 0};  // what was to be closed, for the notification that comes next
 };
 
@@ -162,6 +165,7 @@ void end_step(bool is_done) {
   const NotificationDone done = std::move(queue().steps.front().done);
   queue().steps.pop_front();
   queue().is_busy = false;
+  queue().has_waited = false;
   done(is_done);
   advance();
 }
@@ -200,7 +204,30 @@ bool is_new_notification_next() {
          !next.content.is_toast && shown_under_tag(next).empty();
 }
 
+void stop_waiting() {
+  queue().successor_timer = 0;
+  queue().is_busy = false;
+  release_end();
+}
+
+gboolean waited_cb(gpointer) {
+  stop_waiting();
+  advance();
+  return G_SOURCE_REMOVE;
+}
+
+// The close and the show of a replacement are two requests, between which their sender may lose the
+// processor.
+bool must_wait(const std::vector<Shown> &found) {
+  if (found.empty() || queue().steps.size() > 1 || queue().has_waited) return false;
+  queue().has_waited = true;
+  hold_end();
+  queue().successor_timer = g_timeout_add(kSuccessorMs, waited_cb, nullptr);
+  return true;
+}
+
 void close(const Server &server, const std::vector<Shown> &found) {
+  if (must_wait(found)) return;
   // What is on the screen becomes the one that follows, so that there is never a moment with none or both.
   // Its row stays until then: a process that dies in between leaves a notification that can be closed.
   if (!found.empty() && found.back().server == server.name && is_new_notification_next()) {
@@ -226,6 +253,7 @@ std::vector<Shown> to_close(const NotificationStep &step) {
 // Nobody shows notifications here, now; what comes later asks again.
 void drop_all() {
   queue().is_busy = false;
+  queue().has_waited = false;
   queue().inherited = {"", 0};
   for (const Waiting &waiting : std::exchange(queue().steps, {})) waiting.done(false);
 }
@@ -264,6 +292,10 @@ void advance() {
 
 void take_notification_step(NotificationStep step, NotificationDone done) {
   queue().steps.push_back({std::move(step), std::move(done)});
+  if (queue().successor_timer) {
+    g_source_remove(queue().successor_timer);
+    stop_waiting();
+  }
   advance();
 }
 
