@@ -19,7 +19,8 @@ class Desktop:
 
     def __enter__(self):
         read_end, write_end = os.pipe()
-        self.run("Xvfb", "-displayfd", str(write_end), "-screen", "0", f"{self.size}x24", pass_fds=[write_end])
+        self.run("Xvfb", "-displayfd", str(write_end), "-screen", "0", f"{self.size}x24", "-noreset",
+                 pass_fds=[write_end])
         os.close(write_end)
         bus = self.run("dbus-daemon", "--session", "--nofork", "--print-address", stdout=subprocess.PIPE, text=True,
                        env={**os.environ, "XDG_RUNTIME_DIR": str(self.folder), "GSETTINGS_BACKEND": "memory"})

@@ -202,7 +202,10 @@ class WindowLifeCycle : public LaunchRequest {
   void SetUp() override {
     int ends[2];
     ASSERT_EQ(pipe(ends), 0);
-    server_ = start({"Xvfb", "-displayfd", "1", "-screen", "0", "720x1280x24", "-nolisten", "tcp"}, ends[1]);
+    // Without -noreset the end of the first xprop resets the server, and refuses a manager that is
+    // connecting.
+    server_ = start(
+        {"Xvfb", "-displayfd", "1", "-screen", "0", "720x1280x24", "-nolisten", "tcp", "-noreset"}, ends[1]);
     close(ends[1]);
     char number[16] = {};
     ASSERT_GT(read(ends[0], number, sizeof(number) - 1), 0);
