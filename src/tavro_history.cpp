@@ -115,8 +115,10 @@ void _change_buttons(appdata *ad, bool is_selecting, bool has_rows) {
   history_app_data_s *history = ad->history_ad;
   tavro_history_view *view = history->view;
   const bool has_actions = has_rows || !view->choice.is_all();
-  if (view->delete_button && is_selecting) return;
-  if (!is_selecting && view->search_button && has_actions) return;
+  const bool are_shown = elm_object_part_content_get(history->page, "tavro.swallow.start") &&
+                         (view->delete_button != nullptr) == is_selecting &&
+                         (view->search_button != nullptr) == (!is_selecting && has_actions);
+  if (are_shown) return;
   Evas_Object *start = tavro_button_add(
       history->page, "tavro_icon", nullptr,
       tavro_icon_add(history->page, is_selecting ? "close/on" : "back/on"),

@@ -22,13 +22,20 @@ Efl_Access_State_Set states_of(Eo *control, void *) {
   return states;
 }
 
+// Once an object: the toolkit never frees an override that another replaces.
+void tell_states(Evas_Object *obj) {
+  constexpr char kIsTold[] = "tavro_states_told";
+  if (efl_key_data_get(obj, kIsTold)) return;
+  EFL_OPS_DEFINE(overrides, EFL_OBJECT_OP_FUNC(efl_access_object_state_set_get, states_of));
+  if (efl_object_override(obj, &overrides)) efl_key_data_set(obj, kIsTold, obj);
+}
+
 }  // namespace
 
 void elm_atspi_accessible_name_set(Evas_Object *obj, const char *name) {
-  EFL_OPS_DEFINE(overrides, EFL_OBJECT_OP_FUNC(efl_access_object_state_set_get, states_of));
   const bool is_widget =
       efl_isa(obj, EFL_CANVAS_OBJECT_CLASS);  // else an item, which tells its states itself
-  if (is_widget) efl_object_override(obj, &overrides);
+  if (is_widget) tell_states(obj);
   efl_access_object_i18n_name_set(obj, name);
 }
 
