@@ -1,5 +1,6 @@
-/* Pictures as pixels: decode a JPEG or PNG file, encode pixels as JPEG. Every function may be called on any
- * thread, each handle on one at a time; calls block for as long as disk and decoder take. */
+/* Pictures as pixels: decode a JPEG, PNG or WebP file, resize and rotate, encode pixels as JPEG. Every
+ * function may be called on any thread, each handle on one at a time; calls block for as long as disk and
+ * decoder take. */
 #pragma once
 
 #include <tizen_error.h>
@@ -30,6 +31,15 @@ typedef enum {
   IMAGE_UTIL_DOWNSCALE_1_8,
 } image_util_scale_e;
 
+typedef enum {
+  IMAGE_UTIL_ROTATION_NONE = 0,
+  IMAGE_UTIL_ROTATION_90 = 1,
+  IMAGE_UTIL_ROTATION_180 = 2,
+  IMAGE_UTIL_ROTATION_270 = 3,
+  IMAGE_UTIL_ROTATION_FLIP_HORZ = 4, /* left and right change places */
+  IMAGE_UTIL_ROTATION_FLIP_VERT = 5, /* top and bottom */
+} image_util_rotation_e;
+
 typedef struct image_util_decode_s *image_util_decode_h;
 
 /* The caller destroys the handle. */
@@ -46,6 +56,20 @@ int image_util_decode_set_output_buffer(image_util_decode_h handle, unsigned cha
  * not applied. `size` in bytes; any result may be null. On failure the buffer is left as it was. */
 int image_util_decode_run(image_util_decode_h handle, unsigned long *width, unsigned long *height,
                           unsigned long long *size);
+
+/* Bytes that a picture of this size takes. */
+int image_util_calculate_buffer_size(int width, int height, image_util_colorspace_e colorspace,
+                                     unsigned int *size);
+
+/* Pixels into a buffer of the caller's that has room for them and does not overlap the source. */
+
+/* Scale to *dest_width x *dest_height, whatever the proportions. */
+int image_util_resize(unsigned char *dest, int *dest_width, int *dest_height, const unsigned char *src,
+                      int src_width, int src_height, image_util_colorspace_e colorspace);
+/* Rotate clockwise or flip; tells the size of the result. */
+int image_util_rotate(unsigned char *dest, int *dest_width, int *dest_height,
+                      image_util_rotation_e dest_rotation, const unsigned char *src, int src_width,
+                      int src_height, image_util_colorspace_e colorspace);
 
 /* Write a JPEG (quality 1 to 100; alpha is left out), over whatever the path held. The mode of a new file
  * follows the process's umask. */

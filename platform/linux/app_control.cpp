@@ -1,10 +1,11 @@
-#include "app_control_internal.h"
+#include "app_control_caller.h"
 
 #include <algorithm>
 #include <cstdlib>
 #include <new>
 #include <set>
 
+#include "app_control_internal.h"
 #include "scoped.h"
 
 namespace platform {
@@ -209,4 +210,11 @@ int app_control_foreach_extra_data(app_control_h app_control, app_control_extra_
     if (done.insert(pair.first).second && !callback(app_control, pair.first.c_str(), user_data)) break;
   }
   return APP_CONTROL_ERROR_NONE;
+}
+
+int app_control_get_caller(app_control_h app_control, char **name) {
+  const char *caller = app_control && app_control->pending ? app_control->pending->caller() : nullptr;
+  if (!name || !caller) return APP_CONTROL_ERROR_INVALID_PARAMETER;
+  *name = duplicate(caller);
+  return *name ? APP_CONTROL_ERROR_NONE : APP_CONTROL_ERROR_OUT_OF_MEMORY;
 }

@@ -23,6 +23,10 @@ class PendingAnswer {
 
   // False when it is answered already.
   bool answer(app_control_result_e result, GVariant *extra_data);
+  // Null once answered.
+  const char *caller() const {
+    return invocation_ ? g_dbus_method_invocation_get_sender(invocation_) : nullptr;
+  }
 
  private:
   GDBusMethodInvocation *invocation_;  // null once answered

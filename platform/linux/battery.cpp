@@ -1,13 +1,11 @@
 // The battery and its changes, as UPower's display device tells them.
 
 #include <device/battery.h>
-#include <device/callback.h>
 
 #include <algorithm>
-#include <cstdint>
 #include <utility>
-#include <vector>
 
+#include "device_callback.h"
 #include "host_service.h"
 
 namespace {
@@ -49,22 +47,7 @@ device_battery_level_e level_of(int percent) {
   return DEVICE_BATTERY_LEVEL_EMPTY;
 }
 
-struct Listener {
-  device_callback_e type;
-  device_changed_cb callback;
-  void *user_data;
-};
-
-struct BatteryWatch {
-  std::vector<Listener> listeners;
-  bool is_subscribed = false;
-  int last_percent = -1;
-};
-
-BatteryWatch &battery_watch() {
-  static BatteryWatch &watch = *new BatteryWatch;
-  return watch;
-}
+int last_percent = -1;
 
 void changed_cb(GDBusConnection *, const char *, const char *, const char *, const char *,
                 GVariant *arguments, gpointer) {
@@ -73,28 +56,8 @@ void changed_cb(GDBusConnection *, const char *, const char *, const char *, con
   const ScopedVariant percentage = lookup(changed.get(), "Percentage", G_VARIANT_TYPE_DOUBLE);
   if (!percentage) return;
   const int percent = std::clamp(static_cast<int>(g_variant_get_double(percentage.get())), 0, 100);
-  if (std::exchange(battery_watch().last_percent, percent) == percent) return;
-  // A copy: callbacks may remove themselves.
-  const std::vector<Listener> listeners = battery_watch().listeners;
-  for (const Listener &listener : listeners) {
-    listener.callback(listener.type, reinterpret_cast<void *>(static_cast<intptr_t>(percent)),
-                      listener.user_data);
-  }
-}
-
-// The subscription stays for the life of the process: it costs nothing while the battery does not change.
-void subscribe(GDBusConnection *bus) {
-  if (!bus || std::exchange(battery_watch().is_subscribed, true)) return;
-  g_dbus_connection_signal_subscribe(bus, kService, kPropertiesInterface, "PropertiesChanged", kDevicePath,
-                                     kDeviceInterface, G_DBUS_SIGNAL_FLAGS_NONE, changed_cb, nullptr,
-                                     nullptr);
-}
-
-auto find_listener(device_callback_e type, device_changed_cb callback) {
-  auto &listeners = battery_watch().listeners;
-  return std::find_if(listeners.begin(), listeners.end(), [&](const Listener &known) {
-    return known.type == type && known.callback == callback;
-  });
+  if (std::exchange(last_percent, percent) != percent)
+    report_device_change(DEVICE_CALLBACK_BATTERY_CAPACITY, percent);
 }
 
 template <typename Value, typename Field>
@@ -120,18 +83,11 @@ int device_battery_get_level_status(device_battery_level_e *status) {
   return read_value(status, [](const Battery &battery) { return level_of(battery.percent); });
 }
 
-int device_add_callback(device_callback_e type, device_changed_cb callback, void *user_data) {
-  if (type != DEVICE_CALLBACK_BATTERY_CAPACITY || !callback) return DEVICE_ERROR_INVALID_PARAMETER;
-  auto &listeners = battery_watch().listeners;
-  if (find_listener(type, callback) != listeners.end()) return DEVICE_ERROR_ALREADY_IN_PROGRESS;
-  listeners.push_back({type, callback, user_data});
-  with_host_bus(HostBus::kSystem, subscribe);
-  return DEVICE_ERROR_NONE;
-}
-
-int device_remove_callback(device_callback_e type, device_changed_cb callback) {
-  const auto known = find_listener(type, callback);
-  if (known == battery_watch().listeners.end()) return DEVICE_ERROR_INVALID_PARAMETER;
-  battery_watch().listeners.erase(known);
-  return DEVICE_ERROR_NONE;
+// The subscription stays for the life of the process: it costs nothing while the battery does not change.
+void platform::watch_battery(GDBusConnection *bus) {
+  static bool is_subscribed = false;
+  if (!bus || std::exchange(is_subscribed, true)) return;
+  g_dbus_connection_signal_subscribe(bus, kService, kPropertiesInterface, "PropertiesChanged", kDevicePath,
+                                     kDeviceInterface, G_DBUS_SIGNAL_FLAGS_NONE, changed_cb, nullptr,
+                                     nullptr);
 }

@@ -9,19 +9,13 @@
 #include <vector>
 
 #include "bus.h"
-#include "database.h"
+#include "notification_record.h"
 
 namespace platform {
 namespace {
 
 constexpr int kCallTimeoutMs = 10'000;
 constexpr guint kSuccessorMs = 100;  // within which what is closed may be replaced by something new
-
-// A notification as the service knows it.
-struct Shown {
-  std::string server;
-  guint32 id;
-};
 
 struct Waiting {
   NotificationStep step;
@@ -51,58 +45,6 @@ struct Server {
   std::string name;
   bool reads_markup;
 };
-
-void remember(const NotificationStep &step, const Shown &shown) {
-  const NotificationContent &content = step.content;
-  const auto bind_some = [](sqlite3_stmt *statement, int index, const std::string &text) {
-    if (!text.empty()) bind_text(statement, index, text.c_str());
-  };
-  preference_database().run(
-      "INSERT OR REPLACE INTO posted_notification(app_id, tag, server, id, type, receiver, request)"
-      " VALUES(?1, ?2, ?3, ?4, ?5, ?6, ?7)",
-      [&](sqlite3_stmt *statement) {
-        bind_text(statement, 1, step.app_id.c_str());
-        bind_text(statement, 2, content.tag.c_str());
-        bind_text(statement, 3, shown.server.c_str());
-        sqlite3_bind_int64(statement, 4, shown.id);
-        sqlite3_bind_int(statement, 5, content.type);
-        bind_some(statement, 6, content.receiver);
-        bind_some(statement, 7, content.request);
-      });
-}
-
-void forget(const Shown &shown) {
-  preference_database().run("DELETE FROM posted_notification WHERE server = ?1 AND id = ?2",
-                            [&shown](sqlite3_stmt *statement) {
-                              bind_text(statement, 1, shown.server.c_str());
-                              sqlite3_bind_int64(statement, 2, shown.id);
-                            });
-}
-
-std::vector<Shown> shown_by(const char *sql, const Database::Bind &bind) {
-  std::vector<Shown> found;
-  preference_database().run(sql, bind, [&found](sqlite3_stmt *statement) {
-    found.push_back({column_text(statement, 0), static_cast<guint32>(sqlite3_column_int64(statement, 1))});
-    return true;
-  });
-  return found;
-}
-
-std::vector<Shown> shown_under_tag(const NotificationStep &step) {
-  return shown_by("SELECT server, id FROM posted_notification WHERE app_id = ?1 AND tag = ?2",
-                  [&step](sqlite3_stmt *statement) {
-                    bind_text(statement, 1, step.app_id.c_str());
-                    bind_text(statement, 2, step.content.tag.c_str());
-                  });
-}
-
-std::vector<Shown> shown_of_type(const NotificationStep &step) {
-  return shown_by("SELECT server, id FROM posted_notification WHERE app_id = ?1 AND type = ?2",
-                  [&step](sqlite3_stmt *statement) {
-                    bind_text(statement, 1, step.app_id.c_str());
-                    sqlite3_bind_int(statement, 2, step.content.type);
-                  });
-}
 
 using Answer = std::function<void(GDBusConnection *, GDBusMessage *)>;  // null message: it failed
 
@@ -141,7 +83,13 @@ GVariant *hints_of(const NotificationStep &step) {
   g_variant_builder_init(&hints, G_VARIANT_TYPE_VARDICT);
   g_variant_builder_add(&hints, "{sv}", "desktop-entry", g_variant_new_string(step.app_id.c_str()));
   if (content.is_ongoing) g_variant_builder_add(&hints, "{sv}", "resident", g_variant_new_boolean(TRUE));
-  if (content.is_toast) g_variant_builder_add(&hints, "{sv}", "transient", g_variant_new_boolean(TRUE));
+  if (content.is_toast) {
+    g_variant_builder_add(&hints, "{sv}", "transient", g_variant_new_boolean(TRUE));
+    // Stands out from a light and a dark page, where the service takes colours.
+    for (const char *ground : {"bgcolor", "frcolor"})
+      g_variant_builder_add(&hints, "{sv}", ground, g_variant_new_string("#323B48"));
+    g_variant_builder_add(&hints, "{sv}", "fgcolor", g_variant_new_string("#FFFFFF"));
+  }
   if (content.progress) {
     const double share = std::clamp(*content.progress, 0.0, 1.0);
     g_variant_builder_add(&hints, "{sv}", "value", g_variant_new_int32(static_cast<int>(share * 100)));
@@ -189,7 +137,7 @@ void show(const Server &server, const NotificationStep &step) {
          if (is_shown && !step.content.is_toast) {
            Shown shown{name, 0};
            g_variant_get(body, "(u)", &shown.id);
-           remember(step, shown);
+           remember_shown(step, shown);
          }
          end_step(is_shown);
        });
@@ -236,7 +184,7 @@ void close(const Server &server, const std::vector<Shown> &found) {
   for (const Shown &shown : found) {
     const bool is_there = shown.server == server.name;
     if (is_there && shown.id == queue().inherited.id) continue;
-    forget(shown);
+    forget_shown(shown);
     if (is_there) {
       g_dbus_connection_call(server.bus, server.address.c_str(), kNotificationPath, kNotificationService,
                              "CloseNotification", g_variant_new("(u)", shown.id), nullptr,

@@ -13,6 +13,7 @@
 #include "app_control_internal.h"
 #include "app_core.h"
 #include "bus.h"
+#include "display_state.h"
 #include "first_frame.h"
 #include "main_loop.h"
 #include "notification_requests.h"
@@ -126,6 +127,7 @@ bool start_toolkit(int argc, char **argv) {
   platform::set_screen_size_source(screen_size);
   platform::merge_glib_into_ecore();
   platform::watch_windows(windows_changed);
+  platform::serve_display_state();
   platform::share_keys_with_screen_reader();
   platform::set_toast_fallback(platform::show_toast_over_window);
   return true;
@@ -154,6 +156,7 @@ int run_application(int argc, char **argv) {
   platform::set_toast_fallback(nullptr);
   platform::finish_outgoing();
   platform::stop_sharing_keys();
+  platform::stop_serving_display_state();
   platform::stop_watching_windows();
   platform::set_screen_size_source(nullptr);
   platform::separate_glib_from_ecore();
