@@ -4,7 +4,7 @@ set(TAVRO_HOME lib/tavro)
 set(TAVRO_PHONE_PROGRAM ${CMAKE_INSTALL_PREFIX}/${TAVRO_HOME}/bin/tavro-phone)
 install(DIRECTORY ${CMAKE_BINARY_DIR}/apps/org.tizen.system.crash DESTINATION ${TAVRO_HOME}/apps
         USE_SOURCE_PERMISSIONS)
-foreach(app corvane.tavro-lite corvane.tavro-svc)
+foreach(app corvane.tavro-lite corvane.tavro-svc corvane.tavro-screen-recorder)
   set(entry ${CMAKE_BINARY_DIR}/packaging/${app}.desktop)
   configure_file(${PROJECT_SOURCE_DIR}/packaging/${app}.desktop.in ${entry} @ONLY)
   install(DIRECTORY ${CMAKE_BINARY_DIR}/apps/${app} DESTINATION ${TAVRO_HOME}/apps USE_SOURCE_PERMISSIONS
@@ -30,7 +30,8 @@ set(CPACK_PACKAGE_DESCRIPTION_SUMMARY "Vantor Community: report problems, share 
 set(CPACK_PACKAGING_INSTALL_PREFIX ${CMAKE_INSTALL_PREFIX})
 set(CPACK_DEBIAN_PACKAGE_SHLIBDEPS ON)
 set(CPACK_DEBIAN_PACKAGE_DEPENDS
-    "bubblewrap, dbus, at-spi2-core, xvfb, openbox, x11-utils, imagemagick, dunst, fonts-noto-core")
+    "bubblewrap, dbus, at-spi2-core, xvfb, openbox, x11-utils, imagemagick, dunst, fonts-noto-core, \
+gstreamer1.0-plugins-base, gstreamer1.0-plugins-good, gstreamer1.0-plugins-ugly")
 set(CPACK_DEBIAN_PACKAGE_SECTION utils)
 set(CPACK_STRIP_FILES ON)
 include(CPack)

@@ -19,7 +19,7 @@ constexpr const char *kWindowManagerConfig = R"(<?xml version="1.0" encoding="UT
 <openbox_config xmlns="http://openbox.org/3.4/rc">
   <focus><focusNew>yes</focusNew><focusLast>yes</focusLast></focus>
   <placement><policy>Smart</policy></placement>
-  <theme><animateIconify>no</animateIconify></theme>
+  <theme><animateIconify>no</animateIconify><keepBorder>no</keepBorder></theme>
   <desktops><number>1</number><popupTime>0</popupTime></desktops>
   <applications>
     <application class="*" type="normal"><decor>no</decor><maximized>yes</maximized></application>

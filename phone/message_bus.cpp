@@ -51,7 +51,7 @@ bool write_service(const std::string &folder, const std::string &name, const std
 }
 
 bool write_services(const std::string &folder, bool starts_accessibility_bus) {
-  for (const char *app_id : {kClientId, kServiceId, kCrashServiceId}) {
+  for (const char *app_id : {kClientId, kServiceId, kCrashServiceId, kRecorderId}) {
     if (is_installed(app_id) && !write_service(folder, app_id, quoted(application_program(app_id))))
       return false;
   }
@@ -80,7 +80,7 @@ bool write_bus_files(const Folder &folder, const std::string &socket_folder, boo
     say("cannot make " + services + ": " + g_strerror(errno));
     return false;
   }
-  for (const char *old : {kClientId, kServiceId, kCrashServiceId, "org.a11y.Bus"}) {
+  for (const char *old : {kClientId, kServiceId, kCrashServiceId, kRecorderId, "org.a11y.Bus"}) {
     unlink((services + "/" + old + ".service").c_str());
   }
   const std::string socket = socket_folder + "/bus";

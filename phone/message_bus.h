@@ -36,6 +36,7 @@ std::string plain_message(const GError *error);
 
 constexpr const char *kClientId = "corvane.tavro-lite";
 constexpr const char *kServiceId = "corvane.tavro-svc";
+constexpr const char *kRecorderId = "corvane.tavro-screen-recorder";
 constexpr const char *kCrashServiceId = "org.tizen.system.crash";
 
 }  // namespace phone

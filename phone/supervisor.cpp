@@ -22,43 +22,6 @@ constexpr int kProgramPatienceMilliseconds = 1000;
 
 }  // namespace
 
-std::vector<std::string> supervise_command(const StartOptions &options) {
-  std::vector<std::string> command = {
-      own_program(), "supervise",
-      "--dir",       options.folder.dir,
-      "--size",      std::to_string(options.size.width) + "x" + std::to_string(options.size.height)};
-  if (!options.desk_url.empty()) command.insert(command.end(), {"--desk", options.desk_url});
-  if (options.mode == Mode::kDirect) command.push_back("--direct");
-  if (options.is_headless) command.push_back("--headless");
-  if (options.is_detached) command.push_back("--detach");
-  if (options.is_accessible) command.push_back("--accessible");
-  if (!options.has_client) command.push_back("--no-client");
-  return command;
-}
-
-int command_supervise(int argc, char **argv) {
-  StartOptions options;
-  std::string size;
-  bool is_direct = false;
-  bool has_no_client = false;
-  CommandLine line("", "Run the inner half of a phone. Used by \"start\".");
-  line.text("dir", &options.folder.dir, "The phone's folder", "DIR");
-  line.text("desk", &options.desk_url, "Address of the desk", "URL");
-  line.text("size", &size, "Size of the virtual display", "WxH");
-  line.flag("direct", &is_direct, "Run in place");
-  line.flag("headless", &options.is_headless, "Use a virtual display");
-  line.flag("detach", &options.is_detached, "Leave the terminal");
-  line.flag("accessible", &options.is_accessible, "Publish windows to screen readers");
-  line.flag("no-client", &has_no_client, "Do not show the client");
-  if (!line.parse(argc, argv) || options.folder.dir.empty() || !parse_size(size, &options.size))
-    return kUsage;
-  options.mode = is_direct ? Mode::kDirect : Mode::kSandbox;
-  options.has_client = !has_no_client;
-  for (const int fd : {kLifeLine, kLockHandle, kTerminal}) fcntl(fd, F_SETFD, FD_CLOEXEC);
-  say_on(kTerminal);
-  return Supervisor(std::move(options)).run();
-}
-
 ExitStatus Supervisor::run() {
   g_unix_fd_add(kLifeLine, static_cast<GIOCondition>(G_IO_IN | G_IO_HUP), life_line_cb, this);
   for (const int number : {SIGINT, SIGTERM, SIGHUP}) g_unix_signal_add(number, signal_cb, this);
@@ -261,7 +224,7 @@ void Supervisor::announce_ready() {
 void Supervisor::shut_down() {
   service_keepers_.clear();
   if (bus_) {
-    for (const char *app_id : {kClientId, kServiceId, kCrashServiceId}) {
+    for (const char *app_id : {kClientId, kRecorderId, kServiceId, kCrashServiceId}) {
       end_application(bus_.get(), app_id, kApplicationPatienceMilliseconds);
     }
   }
@@ -312,7 +275,7 @@ std::string Supervisor::status_lines() const {
         program->is_running() ? "runs, pid " + std::to_string(program->pid()) : "starts again";
     text += program->name() + ": " + state + "\n";
   }
-  for (const char *app_id : {kServiceId, kClientId, kCrashServiceId}) {
+  for (const char *app_id : {kServiceId, kClientId, kCrashServiceId, kRecorderId}) {
     const int pid = bus_ ? application_pid(bus_.get(), app_id) : 0;
     text += std::string(app_id) + ": " + (pid ? "runs, pid " + std::to_string(pid) : "does not run") + "\n";
   }
