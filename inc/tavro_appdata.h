@@ -20,3 +20,8 @@ void tavro_voc_list_lock_destroy(appdata *ad);
 // its record at once, one with a window when its widgets are gone. No window is built from then on.
 void tavro_request_exit(appdata *ad);
 bool tavro_is_ending();
+
+// Add to ie_select_box_list the box of an attached screenshot, in pixels of the attached file; all -1 for a
+// video. Free all of them.
+void tavro_select_box_add(appdata *ad, int x, int y, int width, int height);
+void tavro_select_boxes_free(appdata *ad);

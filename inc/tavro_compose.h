@@ -3,6 +3,7 @@
 // Main loop only; asks the disk about single files.
 #pragma once
 
+#include <Elementary.h>
 #include <glib.h>
 
 #include <string>
@@ -14,6 +15,15 @@ struct appdata;
 
 // The open compose record, null when neither screen is open; there is one at most.
 compose_view_win *tavro_compose_view(appdata *ad);
+
+// The page to be shown of the open screen: its own, or that of an image editor above it in which something
+// would be lost. Null when no screen is open.
+Elm_Object_Item *tavro_compose_front_page(appdata *ad);
+
+// The open screen has come up, or come back from below a page or window: for half a second touches do
+// nothing, as the second tap of a double one was meant for what was there before. Keys and screen readers do
+// not wait.
+void tavro_compose_rest(appdata *ad);
 
 // What keeps a report from being sent, first things first.
 enum tavro_compose_gap {
@@ -35,7 +45,7 @@ gint64 tavro_attachment_size(const char *path);
 // them.
 constexpr unsigned kMostAttachments = 29;
 
-// Why a file cannot be attached. Pictures (JPEG, PNG) and videos (MP4) are told by what they hold.
+// Why a file cannot be attached. Pictures (JPEG, PNG, WebP) and videos (MP4) are told by what they hold.
 enum tavro_attachment_fault {
   TAVRO_ATTACHMENT_GOOD = 0,
   TAVRO_ATTACHMENT_UNREADABLE,  // gone, not a plain file, or not readable
@@ -46,9 +56,15 @@ enum tavro_attachment_fault {
 };
 tavro_attachment_fault tavro_attachment_check(const compose_view_win *view, const char *path);
 
+// Whether the file is a picture that goes as a copy in another format: tavro_compose_convert. Reads its
+// header.
+bool tavro_compose_wants_conversion(const char *path);
+
 // Attach a file unless it is attached already; false when it cannot be attached. Keeps `buffer`.
 bool tavro_compose_attach(compose_view_win *view, const char *path);
 void tavro_compose_detach(compose_view_win *view, const char *path);
+// What the open screen has attached; nothing when none is open.
+std::vector<std::string> tavro_compose_attached(const appdata *ad);
 // Move an attachment by `steps` places, as far as there are places.
 void tavro_compose_move(compose_view_win *view, const char *path, int steps);
 // Add `buffer` up anew: files change while they are attached.

@@ -27,6 +27,10 @@ struct compose_view_win {
   char *app_icon;  // path of the target's icon, may be null
   gint64 buffer;   // total size of the attachments in bytes, kept by the screen
 
+  // What is being captured for this report: the file that is to come, and "jpg" or "mp4". Null: nothing is.
+  char *filename;
+  char *file_type;
+
   // The screen's other widgets; the saver does not look at them.
   Evas_Object *target_button;
   Evas_Object *strip;    // box of the attachments' thumbnails

@@ -27,7 +27,7 @@ std::vector<std::string> tavro_gallery_folders();
 // Receives what was found since its last call, in the order of showing; false ends the walk.
 using tavro_gallery_found = std::function<bool(std::vector<tavro_gallery_file>)>;
 
-// Walk the folders three levels deep for JPEG, PNG and MP4 files. Hidden files and folders and symbolic links
-// are left out. `found` is called at the end of the walk and, while it takes long, several times a second.
-// Returns how many folders were there but could not be read.
+// Walk the folders three levels deep for JPEG, PNG, WebP and MP4 files. Hidden files and folders and symbolic
+// links are left out. `found` is called at the end of the walk and, while it takes long, several times a
+// second. Returns how many folders were there but could not be read.
 int tavro_gallery_walk(const std::vector<std::string> &folders, const tavro_gallery_found &found);

@@ -8,13 +8,6 @@
 
 #include "tavro-main.h"
 
-// Capture manager and floating capture control. A capture that was started attaches what it takes to the open
-// compose screen; false when it cannot start.
-bool tavro_capture_start(appdata *ad, captureType type);
-void send_cpmgr_shutdown(appdata *ad);
-void record_btn_clicked_cb(void *data, Evas_Object *obj, void *event_info);
-void tavro_cpmgr_on_get_error_cb(app_control_h service, appdata *ad);
-
 // Web engine and community pages. `in_background`: 1 when the address is loaded without showing the page.
 void ewk_shutdown();
 void tavro_load_url(appdata *ad, int in_background);

@@ -9,7 +9,7 @@
 
 #include <Elementary.h>
 
-// A picture of `units` by `units` (cropped to fill), empty until the thumbnail is there; a plain tile where
-// the file cannot be read as a picture. The widget belongs to its parent; deleting it gives up the work for
-// it.
+// A picture of `units` by `units` (cropped to fill), empty until the thumbnail is there; of a video, its
+// length, on its picture when it has one; a plain tile where the file cannot be read as a picture. The widget
+// belongs to its parent; deleting it gives up the work for it.
 Evas_Object *tavro_thumbnail_add(Evas_Object *parent, const char *path, int units);

@@ -4,6 +4,10 @@ set(TAVRO_CLIENT_CORE
   tavro_appcontrol_util.cpp
   tavro_appdata.cpp
   tavro_autosave.cpp
+  tavro_capture.cpp
+  tavro_capture_buttons.cpp
+  tavro_capture_replies.cpp
+  tavro_capture_wait.cpp
   tavro_compose_keeper.cpp
   tavro_compose_kept.cpp
   tavro_compose_state.cpp
@@ -20,6 +24,9 @@ set(TAVRO_CLIENT_CORE
   tavro_follow_up.cpp
   tavro_follow_up_kept.cpp
   tavro_history_text.cpp
+  tavro_image_copy.cpp
+  tavro_image_editor_steps.cpp
+  tavro_image_editor_work.cpp
   tavro_lifecycle.cpp
   tavro_log_archive.cpp
   tavro_log_folder.cpp
@@ -39,4 +46,5 @@ set(TAVRO_CLIENT_CORE
   tavro_sign_out.cpp
   tavro_start.cpp
   tavro_system_log.cpp
-  tavro_version_check.cpp)
+  tavro_version_check.cpp
+  tavro_video_info.cpp)

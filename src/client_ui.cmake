@@ -12,13 +12,13 @@ set(TAVRO_CLIENT_UI
   tavro_target_rows.cpp
   tavro_thumbnail_maker.cpp
   tavro_thumbnail_cache.cpp
-  tavro_picture_info.cpp
   tavro_app_list_store.cpp
   tavro_app_list.cpp
   tavro_gallery.cpp
   tavro_thumbnails.cpp
   tavro_details_text.cpp
   tavro_compose_attach.cpp
+  tavro_compose_convert.cpp
   tavro_compose_dump.cpp
   tavro_compose_end.cpp
   tavro_compose_log.cpp
@@ -31,8 +31,24 @@ set(TAVRO_CLIENT_UI
   tavro_text_page.cpp
   tavro_text_parts.cpp
   tavro_viewer.cpp
+  ie_selectbox_geometry.cpp
+  ie_selectbox.cpp
+  ie_selectbox_touch.cpp
+  tavro_image_editor.cpp
+  tavro_image_editor_attach.cpp
+  tavro_image_editor_canvas.cpp
+  tavro_image_editor_job.cpp
+  tavro_image_editor_keys.cpp
+  tavro_image_editor_tools.cpp
   tavro_target_picker.cpp
   tavro_gallery_picker.cpp
+  tavro_hoverui.cpp
+  tavro_hoverui_border.cpp
+  tavro_hoverui_control.cpp
+  tavro_hoverui_discard.cpp
+  tavro_hoverui_hint.cpp
+  tavro_hoverui_time.cpp
+  tavro_hoverui_window.cpp
   tavro_landing.cpp
   tavro_account_page.cpp
   tavro_history.cpp

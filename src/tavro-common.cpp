@@ -7,6 +7,7 @@
 #include <cerrno>
 #include <cstring>
 #include <string>
+#include <vector>
 
 #include "tavro-main.h"
 #include "tavro_focus.h"
@@ -48,6 +49,16 @@ Evas_Object *_build_window(appdata *ad) {
 void _back_key_cb(void *data, Evas_Object *, void *) {
   appdata *ad = static_cast<appdata *>(data);
   elm_naviframe_item_pop(ad->nf);
+}
+
+std::vector<Evas_Object **> _slots(appdata *ad) {
+  return {
+      &ad->version_popup,      &ad->delete_fd_popup, &ad->delete_popup,     &ad->history_edit_popup,
+      &ad->history_file_popup, &ad->settings_popup,  &ad->imgedit_popup,    &ad->cancel_popup,
+      &ad->connection_popup,   &ad->crash_popup,     &ad->signout_popup,    &ad->crashpopup_win,
+      &ad->cpmgr_popup,        &ad->quit_beta_popup, &ad->next_steps_popup, &ad->corvane_account_optin_popup,
+      &ad->opt_out_popup,
+  };
 }
 
 }  // namespace
@@ -100,4 +111,18 @@ void tavro_pop_naviframe_middle_items(appdata *ad) {
   if (!ad->nf || !ad->landing_nf_it) return;
   Elm_Object_Item *kept = _guard.kept_page ? _guard.kept_page(ad) : nullptr;
   elm_naviframe_item_pop_to(kept ? kept : ad->landing_nf_it);
+}
+
+void tavro_delete_all_popup(appdata *ad) {
+  for (Evas_Object **slot : _slots(ad))
+    if (*slot) {
+      evas_object_del(*slot);
+      *slot = nullptr;
+    }
+}
+
+Evas_Object *tavro_popup_shown(const appdata *ad) {
+  for (Evas_Object *const *slot : _slots(const_cast<appdata *>(ad)))
+    if (*slot && *slot != ad->crash_popup && *slot != ad->crashpopup_win) return *slot;
+  return nullptr;
 }

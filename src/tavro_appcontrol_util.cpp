@@ -5,6 +5,7 @@
 
 #include "tavro-main.h"
 #include "tavro_appdata.h"
+#include "tavro_capture.h"
 #include "tavro_crash_report.h"
 #include "tavro_launch_tables.h"
 #include "tavro_log.h"
@@ -31,6 +32,10 @@ struct operation_row {
   const char *log_line;   // null: none
   step steps[kMostSteps];
 };
+
+void _capture_failed(app_control_h, appdata *ad) {
+  tavro_cpmgr_on_get_error_cb(0, ad);
+}
 
 void _null_window(app_control_h, appdata *ad) {
   tavro_handle_null_window(ad);
@@ -90,7 +95,7 @@ void _start_or_click(app_control_h request, appdata *ad) {
 
 // The order of the rows is part of the contract: the first that matches decides.
 constexpr operation_row kRows[] = {
-    {"CPMGR_ERROR", "Error received from CPMGR", {tavro_cpmgr_on_get_error_cb, _null_window}},
+    {"CPMGR_ERROR", "Error received from CPMGR", {_capture_failed, _null_window}},
     {"TAVRO_GET_BETA_URLS", "beta urls obtained", {_null_window, _load_url}},
     {"TAVRO_LICENSE_URL", "License url obtained", {_null_window, _load_url}},
     {"TAVRO_BOARDS_URLS", "Boards urls obtained", {_exit_without_window, _load_known_url}},

@@ -22,6 +22,10 @@ void _free_text_list(GSList *&texts) {
   texts = nullptr;
 }
 
+struct select_box {
+  int x, y, width, height;
+};
+
 // Lists whose elements belong to the screens that fill them.
 void _free_list_nodes(GSList *&list) {
   g_slist_free(list);
@@ -54,8 +58,9 @@ void tavro_dealloc_memory(appdata *ad) {
   tavro_free_compose_view(ad);
   _free_texts(ad);
   _free_text_list(ad->image_list);
-  for (GSList **list : {&ad->ie_select_box_list, &ad->color_table, &ad->font_table, &ad->banner_list,
-                        &ad->available_beta_list, &ad->opted_beta_list}) {
+  tavro_select_boxes_free(ad);
+  for (GSList **list : {&ad->color_table, &ad->font_table, &ad->banner_list, &ad->available_beta_list,
+                        &ad->opted_beta_list}) {
     _free_list_nodes(*list);
   }
   if (ad->noti) {
@@ -63,6 +68,20 @@ void tavro_dealloc_memory(appdata *ad) {
     ad->noti = nullptr;
   }
   tavro_voc_list_lock_destroy(ad);
+}
+
+void tavro_select_box_add(appdata *ad, int x, int y, int width, int height) {
+  auto *box = TAVRO_ZALLOC(select_box);
+  *box = {x, y, width, height};
+  ad->ie_select_box_list = g_slist_append(ad->ie_select_box_list, box);
+}
+
+void tavro_select_boxes_free(appdata *ad) {
+  for (GSList *node = ad->ie_select_box_list; node; node = node->next) {
+    auto *box = static_cast<select_box *>(node->data);
+    TAVRO_FREE(box);
+  }
+  _free_list_nodes(ad->ie_select_box_list);
 }
 
 void tavro_voc_list_lock_create(appdata *ad) {

@@ -8,6 +8,7 @@
 #include "tavro-main.h"
 #include "tavro_autosave.h"
 #include "tavro_compose.h"
+#include "tavro_compose_convert.h"
 #include "tavro_compose_keeper.h"
 #include "tavro_compose_parts.h"
 #include "tavro_compose_strip.h"
@@ -82,6 +83,18 @@ void _typed_cb(void *, Evas_Object *, void *) {
 
 void _target_clicked_cb(void *data, Evas_Object *, void *) {
   tavro_create_target_picker(static_cast<appdata *>(data), _target_chosen);
+}
+
+// A page above has closed, or this one has just come up.
+void _page_shown_cb(void *data, Evas_Object *nf, void *) {
+  appdata *ad = static_cast<appdata *>(data);
+  const compose_view_win *view = tavro_compose_view(ad);
+  if (view && elm_naviframe_top_item_get(nf) == view->nf_it) tavro_compose_rest(ad);
+}
+
+void _page_gone_cb(void *data, Evas *, Evas_Object *, void *) {
+  appdata *ad = static_cast<appdata *>(data);
+  if (ad->nf) evas_object_smart_callback_del_full(ad->nf, "transition,finished", _page_shown_cb, ad);
 }
 
 // ---- Building ----
@@ -165,10 +178,13 @@ void _build_page(appdata *ad, compose_view_win *view, const svc_voc_data *draft,
   view->nf_it = tavro_page_push(ad, view->layout, title);
   tavro_compose_guard(ad);
   evas_object_smart_callback_add(ad->nf, "transition,finished", _focus_title_cb, ad);
+  evas_object_smart_callback_add(ad->nf, "transition,finished", _page_shown_cb, ad);
+  evas_object_event_callback_add(view->layout, EVAS_CALLBACK_DEL, _page_gone_cb, ad);
   for (Evas_Object *entry : {view->title_entry, view->entry})
     evas_object_smart_callback_add(entry, "changed", _typed_cb, nullptr);
   tavro_autosave_start(ad, tavro_compose_end_unchanged);
   tavro_compose_keeper_start(ad);
+  tavro_compose_convert(ad);  // of a draft that was stored meanwhile
 }
 
 // The dump and the system log that a draft of a problem holds.
@@ -185,6 +201,14 @@ void _take_files(problem_view_win *view, const svc_voc_data *draft) {
 }
 
 }  // namespace
+
+void tavro_compose_rest(appdata *ad) {
+  const compose_view_win *view = tavro_compose_view(ad);
+  if (!view || !view->layout) return;
+  Evas_Object *page = elm_layout_edje_get(view->layout);
+  edje_object_signal_emit(page, "tavro,rest", "tavro");
+  edje_object_message_signal_process(page);  // before the next touch
+}
 
 void tavro_create_problem_page(appdata *ad, const svc_voc_data *draft) {
   if (!tavro_leave_compose_page(ad)) return;

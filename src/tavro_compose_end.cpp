@@ -1,5 +1,6 @@
 // How a compose screen ends: sent, saved as a draft, discarded or left, and the question before that.
 #include <string>
+#include <vector>
 
 #include "tavro-common.h"
 #include "tavro-main.h"
@@ -7,8 +8,12 @@
 #include "tavro_compose.h"
 #include "tavro_compose_keeper.h"
 #include "tavro_compose_parts.h"
+#include "tavro_compose_strip.h"
 #include "tavro_crash_archive.h"
 #include "tavro_dbmgr.h"
+#include "tavro_deleted_files.h"
+#include "tavro_handles.h"
+#include "tavro_image_editor.h"
 #include "tavro_report_files.h"
 #include "tavro_screens.h"
 #include "tavro_system_log.h"
@@ -32,6 +37,7 @@ opened_content _content_of(appdata *ad) {
 
 // A log that came by itself can come again; one that the person asked for counts.
 bool _would_lose_something(appdata *ad) {
+  if (tavro_image_editor_kept_page()) return true;
   const bool has_own_log =
       ad->problem_view && ad->problem_view->syslog_filepath && tavro_compose_log_was_switched();
   if (!tavro_compose_has_content(ad)) return has_own_log;
@@ -48,8 +54,11 @@ void _end_parts(appdata *ad) {
 }
 
 // The screen ends without a new record: its automatic copy goes with it, and so does, when the person says
-// "discard", the draft that it was opened from with its log.
+// "discard", the draft that it was opened from with its log, and the copies made for its attachments.
 void _end_without_record(appdata *ad, bool with_draft) {
+  std::vector<int> gone = {ad->auto_saved_id};
+  if (with_draft) gone.push_back(ad->id_to_delete);
+  tavro_deleted_files_note_copies(gone, tavro_compose_attached(ad));
   const bool has_dump = ad->problem_view && ad->problem_view->dump_filepath;
   const std::string dump = has_dump ? ad->problem_view->dump_filepath : "";
   tavro_compose_log_end();
@@ -66,6 +75,7 @@ void _end_without_record(appdata *ad, bool with_draft) {
   tavro_compose_keeper_forget();
   if (has_dump) tavro_crash_archive_delete_unneeded(dump);
   _end_parts(ad);
+  tavro_deleted_files_remove();
 }
 
 void _discard(appdata *ad) {
@@ -73,12 +83,24 @@ void _discard(appdata *ad) {
   tavro_pop_naviframe_middle_items(ad);
 }
 
+std::string _keep_draft_body(const appdata *ad) {
+  const std::string body =
+      tavro_text(ad->id_to_delete >= 1 ? "IDS_OB_BODY_KEEP_CHANGES" : "IDS_OB_BODY_KEEP_DRAFT");
+  if (tavro_autosave_screenshot().empty()) return body;
+  return tavro_text("IDS_OB_BODY_KEEP_SCREENSHOT") + ("\n" + body);
+}
+
 void _ask_before_leaving(appdata *ad) {
   tavro_popup_show(ad, &ad->cancel_popup, tavro_text("IDS_OB_HEADER_KEEP_DRAFT"),
-                   tavro_text(ad->id_to_delete >= 1 ? "IDS_OB_BODY_KEEP_CHANGES" : "IDS_OB_BODY_KEEP_DRAFT"),
+                   _keep_draft_body(ad).c_str(),
                    {{tavro_text("IDS_OB_BUTTON_STAY"), nullptr},
                     {tavro_text("IDS_OB_BUTTON_DISCARD"), _discard},
                     {tavro_text("IDS_OB_BUTTON_SAVE_DRAFT"), tavro_compose_save_draft}});
+}
+
+void _say_refused(appdata *ad, std::string path) {
+  const TavroHandle<GSList, g_slist_free> paths(g_slist_append(nullptr, path.data()));
+  tavro_compose_attach_files(ad, paths.get());
 }
 
 Eina_Bool _pop_cb(void *data, Elm_Object_Item *) {
@@ -94,11 +116,6 @@ bool _may_close(appdata *ad) {
   return false;
 }
 
-Elm_Object_Item *_kept_page(appdata *ad) {
-  const compose_view_win *view = tavro_compose_view(ad);
-  return view ? view->nf_it : nullptr;
-}
-
 // With the window, or after the record: what is kept for the next start stays.
 void _page_deleted_cb(void *data, Evas *, Evas_Object *page, void *) {
   appdata *ad = static_cast<appdata *>(data);
@@ -107,6 +124,12 @@ void _page_deleted_cb(void *data, Evas *, Evas_Object *page, void *) {
 }
 
 }  // namespace
+
+Elm_Object_Item *tavro_compose_front_page(appdata *ad) {
+  const compose_view_win *view = tavro_compose_view(ad);
+  Elm_Object_Item *editor = view ? tavro_image_editor_kept_page() : nullptr;
+  return editor || !view ? editor : view->nf_it;
+}
 
 void tavro_compose_remember_opened(appdata *ad) {
   _opened = _content_of(ad);
@@ -126,7 +149,7 @@ void tavro_compose_guard(appdata *ad) {
   const compose_view_win *view = tavro_compose_view(ad);
   evas_object_event_callback_add(view->layout, EVAS_CALLBACK_DEL, _page_deleted_cb, ad);
   elm_naviframe_item_pop_cb_set(view->nf_it, _pop_cb, ad);
-  tavro_set_page_guard({_may_close, _kept_page});
+  tavro_set_page_guard({_may_close, tavro_compose_front_page});
 }
 
 // A save that fails leaves the screen as it is; one that was refused for its size has said so itself.
@@ -142,7 +165,11 @@ void tavro_compose_finish(appdata *ad, int (*save)(appdata *ad)) {
 }
 
 void tavro_compose_save_draft(appdata *ad) {
-  if (tavro_compose_view(ad)) tavro_compose_finish(ad, tavro_save_compose_draft);
+  if (!tavro_compose_view(ad)) return;
+  const std::string edited = tavro_autosave_screenshot(), screenshot = tavro_autosave_attach_screenshot(ad);
+  if (!edited.empty() && screenshot.empty()) return _say_refused(ad, edited);
+  tavro_compose_finish(ad, tavro_save_compose_draft);
+  if (tavro_compose_view(ad)) tavro_autosave_detach_screenshot(ad, screenshot);
 }
 
 void tavro_compose_discard(appdata *ad) {
@@ -156,10 +183,11 @@ bool tavro_leave_compose_page(appdata *ad) {
   const compose_view_win *view = tavro_compose_view(ad);
   if (!view) return true;
   if (_would_lose_something(ad)) {
-    elm_naviframe_item_pop_to(view->nf_it);
+    elm_naviframe_item_pop_to(tavro_compose_front_page(ad));
     _ask_before_leaving(ad);
     return false;
   }
+  tavro_image_editor_close();
   Elm_Object_Item *page = view->nf_it;
   _end_without_record(ad, false);
   elm_object_item_del(page);

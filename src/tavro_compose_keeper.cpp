@@ -13,6 +13,7 @@
 
 #include "tavro-common.h"
 #include "tavro-main.h"
+#include "tavro_autosave.h"
 #include "tavro_compose.h"
 #include "tavro_compose_kept.h"
 #include "tavro_drafts.h"
@@ -96,6 +97,7 @@ void _add_files_on_screen(std::set<std::string> *paths) {
   const compose_view_win *view = _open_view();
   for (const GSList *link = view ? view->attachments : nullptr; link; link = link->next)
     _add_file(static_cast<const char *>(link->data), paths);
+  if (view) _add_file(tavro_autosave_screenshot().c_str(), paths);
   const problem_view_win *problem = view ? _screen.ad->problem_view : nullptr;
   if (!problem) return;
   for (const char *path : {problem->dump_filepath, problem->syslog_filepath}) _add_file(path, paths);

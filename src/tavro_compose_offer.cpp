@@ -10,6 +10,7 @@
 #include "tavro_compose.h"
 #include "tavro_compose_kept.h"
 #include "tavro_compose_parts.h"
+#include "tavro_deleted_files.h"
 #include "tavro_log.h"
 #include "tavro_preferences.h"
 #include "tavro_screens.h"
@@ -32,9 +33,11 @@ std::optional<kept_writing> _load(const std::string &path) {
   if (!tavro_kept_is_stored(*kept)) return kept;
   // The process ended between storing the report and removing what the report replaces.
   TAVRO_LOGD("%s is stored already", path.c_str());
+  tavro_deleted_files_note_copies({kept->content->id, kept->auto_saved_id}, {});
   for (const int id : {kept->content->id, kept->auto_saved_id})
     if (id >= 1) tavro_dbmgr_destroy_vocs_by_id(id);
   tavro_kept_remove(path);
+  tavro_deleted_files_remove();
   return std::nullopt;
 }
 

@@ -38,6 +38,8 @@ void tavro_compose_review(appdata *ad);
 void tavro_compose_send_from_review(appdata *ad);
 // The system log has changed: a report that waits for it goes on.
 void tavro_compose_send_log_changed(appdata *ad);
+// A picture has been converted, or cannot be: what waits for pictures goes on when it was the last.
+void tavro_compose_send_files_changed(appdata *ad);
 // The screen ends: nothing waits any more.
 void tavro_compose_send_end();
 

@@ -1,5 +1,6 @@
-// The road of "Send": what is missing, files that are gone, a system log that is not there yet, the first
-// look at what is sent, and then the report itself. Each question leaves the screen as it is.
+// The road of "Send": pictures that are being converted, what is missing, files that are gone, a system log
+// that is not there yet, the first look at what is sent, and then the report itself. Each question leaves the
+// screen as it is.
 #include <app_preference.h>
 
 #include <string>
@@ -7,6 +8,7 @@
 #include "tavro-common.h"
 #include "tavro-main.h"
 #include "tavro_compose.h"
+#include "tavro_compose_convert.h"
 #include "tavro_compose_keeper.h"
 #include "tavro_compose_parts.h"
 #include "tavro_compose_strip.h"
@@ -19,11 +21,15 @@ namespace {
 
 // The popup under which a report waits for its log; null while none does.
 Evas_Object *_waiting = nullptr;
+// The same for pictures, and what goes on when they are there.
+Evas_Object *_waiting_for_files = nullptr;
+void (*_go_on)(appdata *ad) = nullptr;
 // The person has seen what is sent, should that not have been stored.
 bool _has_reviewed = false;
 // The person chose to send without the log this time: until "Send" or "What is sent" is chosen anew.
 bool _goes_without_log = false;
 
+void _begin(appdata *ad);
 void _check_log(appdata *ad);
 
 void _show_gap(appdata *ad, tavro_compose_gap gap) {
@@ -42,6 +48,27 @@ bool _is_complete(appdata *ad) {
   return false;
 }
 
+// `data` is the variable that holds the popup.
+void _waiting_deleted_cb(void *data, Evas *, Evas_Object *popup, void *) {
+  Evas_Object **waiting = static_cast<Evas_Object **>(data);
+  if (*waiting == popup) *waiting = nullptr;
+}
+
+// ---- Pictures that are being converted ----
+
+// A picture that turns out to be no good is told in a popup, which ends the wait.
+bool _waits_for_files(appdata *ad, void (*go_on)(appdata *ad)) {
+  if (!tavro_compose_convert(ad)) return false;
+  _go_on = go_on;
+  _waiting_for_files = tavro_popup_show(ad, &ad->cancel_popup, tavro_text("IDS_OB_HEADER_PICTURES_AWAITED"),
+                                        tavro_text("IDS_OB_BODY_PICTURES_AWAITED"),
+                                        {{tavro_text("IDS_OB_BUTTON_STAY"), nullptr}});
+  if (_waiting_for_files)
+    evas_object_event_callback_add(_waiting_for_files, EVAS_CALLBACK_DEL, _waiting_deleted_cb,
+                                   &_waiting_for_files);
+  return true;
+}
+
 // ---- The last step, by way of "What is sent" the first time and for drafts ----
 
 // A draft does not remember that the device status was taken off, so it never goes unseen.
@@ -51,6 +78,7 @@ bool _may_go_unseen(const appdata *ad) {
 }
 
 void _send(appdata *ad) {
+  if (_waits_for_files(ad, _begin)) return;  // another application has shared one meanwhile
   if (_has_reviewed || _may_go_unseen(ad))
     tavro_compose_finish(ad, tavro_send_compose_data);
   else
@@ -66,10 +94,6 @@ void _send_without_log(appdata *ad) {
   _send(ad);
 }
 
-void _waiting_deleted_cb(void *, Evas *, Evas_Object *popup, void *) {
-  if (_waiting == popup) _waiting = nullptr;
-}
-
 void _wait_for_log(appdata *ad) {
   const char *title = tavro_text("IDS_OB_HEADER_LOG_AWAITED");
   const char *body = tavro_text("IDS_OB_BODY_LOG_AWAITED");
@@ -78,7 +102,7 @@ void _wait_for_log(appdata *ad) {
   _waiting = isLogMandatory(ad->problem_view->app_name)
                  ? tavro_popup_show(ad, &ad->cancel_popup, title, body, {stay})
                  : tavro_popup_show(ad, &ad->cancel_popup, title, body, {without, stay});
-  if (_waiting) evas_object_event_callback_add(_waiting, EVAS_CALLBACK_DEL, _waiting_deleted_cb, nullptr);
+  if (_waiting) evas_object_event_callback_add(_waiting, EVAS_CALLBACK_DEL, _waiting_deleted_cb, &_waiting);
 }
 
 void _try_log_again(appdata *ad) {
@@ -111,8 +135,6 @@ void _check_log(appdata *ad) {
 
 // ---- Files that were there when they were chosen ----
 
-void _begin(appdata *ad);
-
 void _send_without_lost(appdata *ad) {
   compose_view_win *view = tavro_compose_view(ad);
   if (!view) return;
@@ -130,7 +152,7 @@ bool _has_all_files(appdata *ad) {
 
 void _begin(appdata *ad) {
   compose_view_win *view = tavro_compose_view(ad);
-  if (!view) return;
+  if (!view || _waits_for_files(ad, _begin)) return;
   tavro_compose_count(view);
   if (tavro_compose_dump_is_too_large(ad, _begin) || !_is_complete(ad) || !_has_all_files(ad)) return;
   tavro_compose_log_hurry(ad);
@@ -159,7 +181,7 @@ bool tavro_compose_tell_lost_files(appdata *ad, std::initializer_list<tavro_popu
 }
 
 void tavro_compose_review(appdata *ad) {
-  if (!tavro_compose_view(ad)) return;
+  if (!tavro_compose_view(ad) || _waits_for_files(ad, tavro_compose_review)) return;
   _goes_without_log = false;
   tavro_create_review_page(ad, tavro_compose_send_from_review);
 }
@@ -177,7 +199,14 @@ void tavro_compose_send_log_changed(appdata *ad) {
   _check_log(ad);
 }
 
+void tavro_compose_send_files_changed(appdata *ad) {
+  if (!_waiting_for_files || tavro_compose_convert(ad)) return;
+  evas_object_del(_waiting_for_files);
+  _go_on(ad);
+}
+
 void tavro_compose_send_end() {
   _has_reviewed = _goes_without_log = false;
-  if (_waiting) evas_object_del(_waiting);
+  for (Evas_Object *popup : {_waiting, _waiting_for_files})
+    if (popup) evas_object_del(popup);
 }

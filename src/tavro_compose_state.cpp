@@ -7,14 +7,18 @@
 #include <algorithm>
 #include <cstdlib>
 #include <cstring>
+#include <iterator>
 #include <string_view>
 
 #include "tavro-main.h"
+#include "tavro_byte_reader.h"
 #include "tavro_compose.h"
 #include "tavro_dbmgr.h"
 #include "tavro_handles.h"
+#include "tavro_image_strip.h"
 #include "tavro_log.h"
 #include "tavro_memory.h"
+#include "tavro_picture_info.h"
 
 namespace {
 
@@ -26,14 +30,19 @@ struct file_mark {
 // How the kinds begin that support can open.
 constexpr file_mark kKnownMarks[] = {{0, "\xFF\xD8\xFF"}, {0, "\x89PNG\r\n\x1A\n"}, {4, "ftyp"}};
 
-// Opened without waiting, should the path have become something else than a file.
+// Opened without waiting, should the path have become something else than a file. The upload service cannot
+// take out the metadata of pictures in boxes.
 bool _is_known_kind(const char *path) {
-  char head[12] = {};
+  constexpr ssize_t kShortestFile = 12;
+  std::vector<unsigned char> head(kTellingBytes);
   const TavroFd file(open(path, O_RDONLY | O_NONBLOCK | O_CLOEXEC));
-  if (!file || read(file.get(), head, sizeof head) != sizeof head) return false;
-  for (const file_mark &mark : kKnownMarks)
-    if (mark.bytes.compare(0, mark.bytes.npos, head + mark.offset, mark.bytes.size()) == 0) return true;
-  return false;
+  const ssize_t count = file ? read(file.get(), head.data(), head.size()) : -1;
+  if (count < kShortestFile) return false;
+  head.resize(static_cast<size_t>(count));
+  const tavro_byte_reader bytes(head);
+  return !tavro_is_boxed_picture(head) &&
+         std::any_of(std::begin(kKnownMarks), std::end(kKnownMarks),
+                     [&bytes](const file_mark &mark) { return bytes.has(mark.offset, mark.bytes); });
 }
 
 // A relative path means nothing later on, and what lies beside the store is the client's own.
@@ -73,6 +82,14 @@ compose_view_win *tavro_compose_view(appdata *ad) {
   return const_cast<compose_view_win *>(_open_view(ad));
 }
 
+std::vector<std::string> tavro_compose_attached(const appdata *ad) {
+  std::vector<std::string> paths;
+  const compose_view_win *view = _open_view(ad);
+  for (const GSList *link = view ? view->attachments : nullptr; link; link = link->next)
+    paths.emplace_back(static_cast<const char *>(link->data));
+  return paths;
+}
+
 bool tavro_compose_has_content(const appdata *ad) {
   const compose_view_win *view = _open_view(ad);
   if (!view) return false;
@@ -93,12 +110,17 @@ gint64 tavro_attachment_size(const char *path) {
   return info.st_size;
 }
 
+bool tavro_compose_wants_conversion(const char *path) {
+  tavro_picture_info info{};
+  return tavro_picture_info_read(path, &info) && info.format == TAVRO_PICTURE_WEBP;
+}
+
 tavro_attachment_fault tavro_attachment_check(const compose_view_win *view, const char *path) {
   const gint64 size = tavro_attachment_size(path);
   if (size < 0 || _is_off_limits(path)) return TAVRO_ATTACHMENT_UNREADABLE;
   if (size == 0) return TAVRO_ATTACHMENT_EMPTY;
   if (size > tavro_attachment_size_limit()) return TAVRO_ATTACHMENT_TOO_LARGE;
-  if (!_is_known_kind(path)) return TAVRO_ATTACHMENT_OTHER_KIND;
+  if (!_is_known_kind(path) && !tavro_compose_wants_conversion(path)) return TAVRO_ATTACHMENT_OTHER_KIND;
   return g_slist_length(view->attachments) < kMostAttachments ? TAVRO_ATTACHMENT_GOOD
                                                               : TAVRO_ATTACHMENT_TOO_MANY;
 }

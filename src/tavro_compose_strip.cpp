@@ -5,11 +5,14 @@
 #include <algorithm>
 #include <cstring>
 #include <string>
+#include <utility>
+#include <vector>
 
 #include "tavro-common.h"
 #include "tavro-main.h"
 #include "tavro_compose.h"
 #include "tavro_compose_keeper.h"
+#include "tavro_deleted_files.h"
 #include "tavro_handles.h"
 #include "tavro_memory.h"
 #include "tavro_screens.h"
@@ -18,13 +21,14 @@
 
 namespace {
 
-constexpr int kThumbUnits = 72;
+constexpr int kThumbUnits = 80;
 // How long a finger rests on a picture before its menu comes up.
 constexpr double kLongPressSeconds = 0.5;
 
 // The picture under the finger, until it is lifted or its menu has come up.
 Ecore_Timer *_long_press = nullptr;
 guint _place_to_focus = 0;  // in the strip that is rebuilt after a removal
+std::vector<std::string> _removed;
 
 const char *_path_of(const Evas_Object *widget) {
   return static_cast<const char *>(evas_object_data_get(widget, "path"));
@@ -135,8 +139,9 @@ Evas_Object *_build_attachment(appdata *ad, Evas_Object *strip, const char *path
 void _removed_cb(void *data) {
   appdata *ad = static_cast<appdata *>(data);
   const compose_view_win *view = tavro_compose_view(ad);
-  if (!view) return;
   tavro_compose_strip_refresh(ad);
+  for (const std::string &path : std::exchange(_removed, {})) tavro_compose_strip_dropped(path);
+  if (!view) return;
   tavro_compose_strip_focus(ad,
                             static_cast<const char *>(g_slist_nth_data(view->attachments, _place_to_focus)));
 }
@@ -202,8 +207,15 @@ void tavro_compose_strip_remove(appdata *ad, const char *path) {
   for (const GSList *link = view->attachments;
        link && std::strcmp(static_cast<const char *>(link->data), path) != 0; link = link->next)
     ++_place_to_focus;
+  _removed.emplace_back(path);
   tavro_compose_detach(view, path);
   ecore_job_add(_removed_cb, ad);
+}
+
+void tavro_compose_strip_dropped(const std::string &path) {
+  tavro_compose_keeper_flush();  // what is kept of the screen must not name it any more
+  tavro_deleted_files_note_copies({}, {path});
+  tavro_deleted_files_remove();
 }
 
 void tavro_compose_size_refresh(appdata *ad) {

@@ -9,6 +9,7 @@
 #include <cstdlib>
 #include <cstring>
 #include <iterator>
+#include <optional>
 #include <set>
 #include <utility>
 
@@ -18,6 +19,7 @@
 #include "tavro_log.h"
 #include "tavro_memory.h"
 #include "tavro_note_file.h"
+#include "tavro_video_info.h"
 
 namespace {
 
@@ -117,22 +119,60 @@ bool _read_needed(const std::set<std::string> &paths, std::set<std::string> *nee
 bool _remove(const std::string &path, const std::set<std::string> &needed) {
   const own_file file = _find(path, false);
   if (!file.folder || needed.count(file.path())) return true;
-  if (unlinkat(file.folder.get(), file.name.c_str(), 0) == 0 || errno == ENOENT) return true;
-  TAVRO_LOGE("file of a deleted report: %s", std::strerror(errno));
-  return false;
+  if (unlinkat(file.folder.get(), file.name.c_str(), 0) != 0 && errno != ENOENT) {
+    TAVRO_LOGE("file of a deleted report: %s", std::strerror(errno));
+    return false;
+  }
+  unlinkat(file.folder.get(), tavro_video_picture_name(file.name).c_str(), 0);  // of a video
+  return true;
 }
 
-// Canonical paths of what unfinished writings name. False when that cannot be read.
+// What a capture is making: its canonical path, though it may not be there yet.
+std::string _unfinished;
+
+// Canonical paths of what unfinished writings name, and of what is being made. False when that cannot be
+// read.
 bool _read_kept(std::set<std::string> *kept) {
   const auto paths = tavro_kept_attached_files();
   if (!paths) return false;
   for (const std::string &path : *paths) kept->insert(_canonical(path));
+  if (!_unfinished.empty()) kept->insert(_unfinished);
   return true;
 }
 
 // Noted by this process, or read from the note of an earlier one. Kept here too, as the note may not be
 // written.
 std::set<std::string> _noted;
+
+void _note(std::set<std::string> paths) {
+  if (std::includes(_noted.begin(), _noted.end(), paths.begin(), paths.end())) return;
+  _noted.merge(_read_note());
+  _noted.merge(paths);
+  _write_note(_noted);
+}
+
+std::string _ending(const std::string &name) {
+  const std::size_t dot = name.rfind('.');
+  return dot == std::string::npos ? "" : name.substr(dot);
+}
+
+bool _is_picture(const std::string &name) {
+  return _ending(name) == ".jpg" || _ending(name) == ".png";
+}
+
+bool _is_attachment(const std::string &name) {
+  return _is_picture(name) || _ending(name) == ".mp4";
+}
+
+// The canonical paths of those in the client's own folder whose name is `of_kind`.
+std::set<std::string> _own_of(const std::vector<std::string> &paths, bool (*of_kind)(const std::string &)) {
+  std::set<std::string> own_paths;
+  for (const std::string &path : paths) {
+    const own_file own = _find(path, true);
+    if (!own.folder_path.empty() && of_kind(own.name)) own_paths.insert(own.path());
+  }
+  return own_paths;
+}
 
 }  // namespace
 
@@ -145,11 +185,30 @@ bool tavro_deleted_files_note(const std::vector<int> &voc_ids) {
     const own_file own = _find(file.path, !is_log);
     if (own.folder) paths.insert(own.path());
   }
-  if (paths.empty()) return true;
-  _noted.merge(_read_note());
-  _noted.merge(paths);
-  _write_note(_noted);
+  _note(std::move(paths));
   return true;
+}
+
+void tavro_deleted_files_note_copies(const std::vector<int> &voc_ids, const std::vector<std::string> &paths) {
+  std::vector<tavro_voc_file> named;
+  if (!voc_ids.empty() && tavro_dbmgr_get_voc_files(&voc_ids, &named) != 0)
+    TAVRO_LOGE("copies of attachments not noted: the store cannot be read");
+  std::vector<std::string> attached;
+  for (const tavro_voc_file &file : named) attached.push_back(file.path);
+  std::set<std::string> copies = _own_of(paths, _is_picture);
+  copies.merge(_own_of(attached, _is_attachment));
+  _note(std::move(copies));
+}
+
+void tavro_deleted_files_set_unfinished(const std::string &path) {
+  const own_file own = _find(path, true);
+  _unfinished = own.folder_path.empty() ? "" : own.path();
+  if (!_unfinished.empty()) _note({_unfinished});
+}
+
+void tavro_deleted_files_keep(const std::string &path) {
+  _noted.merge(_read_note());
+  if (_noted.erase(_find(path, true).path()) != 0) _write_note(_noted);
 }
 
 void tavro_deleted_files_remove() {

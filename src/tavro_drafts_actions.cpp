@@ -7,10 +7,12 @@
 
 #include "tavro-common.h"
 #include "tavro-main.h"
+#include "tavro_appdata.h"
 #include "tavro_autosave.h"
 #include "tavro_compose_keeper.h"
 #include "tavro_crash_archive.h"
 #include "tavro_dbmgr.h"
+#include "tavro_deleted_files.h"
 #include "tavro_drafts.h"
 #include "tavro_drafts_save.h"
 #include "tavro_memory.h"
@@ -49,6 +51,7 @@ void _free_image_list(appdata *ad) {
   }
   g_slist_free(ad->image_list);
   ad->image_list = nullptr;
+  tavro_select_boxes_free(ad);
 }
 
 int _save_by_kind(appdata *ad, int status) {
@@ -81,9 +84,11 @@ int _end_compose_screen(appdata *ad, int status) {
     ad->auto_saved_id = auto_saved;
     return id;
   }
+  tavro_deleted_files_note_copies({opened_from, auto_saved}, {});  // some were taken off the screen since
   if (opened_from >= 1) _destroy_replaced_draft(opened_from, log);
   if (auto_saved >= 1 && auto_saved != opened_from) tavro_dbmgr_destroy_vocs_by_id(auto_saved);
   tavro_compose_keeper_forget();
+  tavro_deleted_files_remove();
   tavro_system_log_end(ad);
   tavro_pop_naviframe_middle_items(ad);
   _free_image_list(ad);

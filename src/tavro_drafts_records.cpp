@@ -39,7 +39,8 @@ void _free_text(gpointer data) {
 }
 
 void _free_view(compose_view_win *view) {
-  for (char **text : {&view->description, &view->title_description, &view->app_name, &view->app_icon}) {
+  for (char **text : {&view->description, &view->title_description, &view->app_name, &view->app_icon,
+                      &view->filename, &view->file_type}) {
     TAVRO_FREE(*text);
   }
   g_slist_free_full(view->attachments, _free_text);

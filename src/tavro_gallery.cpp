@@ -54,7 +54,8 @@ class gallery_walk {
     if (lstat(path.c_str(), &info) != 0) return;
     if (S_ISDIR(info.st_mode)) {
       if (depth < kMaxDepth) enter(path, depth + 1);
-    } else if (S_ISREG(info.st_mode) && (is_video || _ends_with_any(path.c_str(), {"jpg", "jpeg", "png"}))) {
+    } else if (S_ISREG(info.st_mode) &&
+               (is_video || _ends_with_any(path.c_str(), {"jpg", "jpeg", "png", "webp"}))) {
       files_.push_back({path, info.st_mtim, is_video});
     }
     if (!files_.empty() && std::chrono::steady_clock::now() - last_report_ > kReportInterval) report();

@@ -6,7 +6,6 @@
 #include "tavro-common.h"
 #include "tavro-main.h"
 #include "tavro_compose.h"
-#include "tavro_gallery.h"
 #include "tavro_history_details.h"
 #include "tavro_memory.h"
 #include "tavro_note_file.h"
@@ -57,8 +56,6 @@ Evas_Object *_build_tile(Evas_Object *row, const char *path, unsigned place) {
   if (is_gone) {
     tavro_layout_text_set(tile, nullptr, gone);
     elm_atspi_accessible_description_set(tile, gone);
-  } else if (tavro_gallery_is_video(path)) {
-    tavro_layout_text_set(tile, nullptr, name.c_str());
   }
   elm_atspi_accessible_name_set(tile, name.c_str());
   return tile;

@@ -8,6 +8,7 @@
 #include "tavro-main.h"
 #include "tavro_appdata.h"
 #include "tavro_autosave.h"
+#include "tavro_capture.h"
 #include "tavro_compose_keeper.h"
 #include "tavro_crash_report.h"
 #include "tavro_dbmgr.h"

@@ -4,23 +4,6 @@
 
 #define TAVRO_NOT_YET(what) TAVRO_LOGD("not there yet: %s", what)
 
-bool tavro_capture_start(appdata *, captureType type) {
-  TAVRO_NOT_YET(type == VIDEO ? "recording the screen" : "taking a screenshot");
-  return false;
-}
-
-void send_cpmgr_shutdown(appdata *) {
-  TAVRO_NOT_YET("shutting the capture service down");
-}
-
-void record_btn_clicked_cb(void *, Evas_Object *, void *) {
-  TAVRO_NOT_YET("the record button");
-}
-
-void tavro_cpmgr_on_get_error_cb(app_control_h, appdata *) {
-  TAVRO_NOT_YET("errors of the capture service");
-}
-
 void ewk_shutdown() {
   TAVRO_NOT_YET("the web engine");
 }

@@ -225,16 +225,6 @@ Evas_Object *_entries_show(appdata *ad, Evas_Object **slot, const char *group,
   return menu;
 }
 
-std::vector<Evas_Object **> _slots(appdata *ad) {
-  return {
-      &ad->version_popup,      &ad->delete_fd_popup, &ad->delete_popup,     &ad->history_edit_popup,
-      &ad->history_file_popup, &ad->settings_popup,  &ad->imgedit_popup,    &ad->cancel_popup,
-      &ad->connection_popup,   &ad->crash_popup,     &ad->signout_popup,    &ad->crashpopup_win,
-      &ad->cpmgr_popup,        &ad->quit_beta_popup, &ad->next_steps_popup, &ad->corvane_account_optin_popup,
-      &ad->opt_out_popup,
-  };
-}
-
 }  // namespace
 
 Evas_Object *tavro_popup_show(appdata *ad, Evas_Object **slot, const char *title, const char *body,
@@ -298,18 +288,4 @@ Evas_Object *tavro_sheet_show(appdata *ad, Evas_Object **slot, const char *title
   tavro_layout_text_set(sheet, "elm.text", title);
   elm_atspi_accessible_name_set(sheet, title);
   return sheet;
-}
-
-void tavro_delete_all_popup(appdata *ad) {
-  for (Evas_Object **slot : _slots(ad))
-    if (*slot) {
-      evas_object_del(*slot);
-      *slot = nullptr;
-    }
-}
-
-Evas_Object *tavro_popup_shown(const appdata *ad) {
-  for (Evas_Object *const *slot : _slots(const_cast<appdata *>(ad)))
-    if (*slot && *slot != ad->crash_popup && *slot != ad->crashpopup_win) return *slot;
-  return nullptr;
 }

@@ -34,7 +34,7 @@ void tavro_prepare_store() {
   is_prepared = true;
   if (tavro_dbmgr_ensure_schema() == TAVRO_STORE_UNUSABLE) return;
   tavro_finish_interrupted_save();
-  tavro_deleted_files_remove();  // of a deletion that was cut off
+  tavro_deleted_files_remove();  // of a deletion or an edit that was cut off
 }
 
 void tavro_tell_store_was_replaced(appdata *ad) {

@@ -82,6 +82,7 @@ void _change(const tavro_review_item &item) {
     problem->is_device_status_removed = item.action == TAVRO_REVIEW_REMOVE;
   }
   tavro_compose_strip_refresh(_review.ad);
+  tavro_compose_strip_dropped(item.path);  // nothing for what is no attachment
   _schedule_rebuild();
 }
 

@@ -75,11 +75,12 @@ void _take(app_control_h request) {
   for (const std::string &text : tavro_request_texts(request, APP_CONTROL_DATA_TEXT)) _add_text(text);
 }
 
-// The open compose screen, brought to the front, or a new one; null when neither can be had.
+// The open compose screen, brought to the front as far as nothing is lost, or a new one; null when neither
+// can be had.
 compose_view_win *_compose_screen(appdata *ad) {
-  compose_view_win *open = tavro_compose_view(ad);
-  if (open && open->nf_it != elm_naviframe_top_item_get(ad->nf)) elm_naviframe_item_pop_to(open->nf_it);
-  if (!open) tavro_create_problem_page(ad, nullptr);
+  Elm_Object_Item *front = tavro_compose_front_page(ad);
+  if (front && front != elm_naviframe_top_item_get(ad->nf)) elm_naviframe_item_pop_to(front);
+  if (!front) tavro_create_problem_page(ad, nullptr);
   return tavro_compose_view(ad);
 }
 

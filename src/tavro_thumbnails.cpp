@@ -1,11 +1,14 @@
 #include "tavro_thumbnails.h"
 
+#include <sys/stat.h>
+
 #include <algorithm>
 #include <memory>
 
 #include "tavro-common.h"
 #include "tavro_gallery.h"
 #include "tavro_thumbnail_maker.h"
+#include "tavro_video_info.h"
 #include "tavro_widgets.h"
 
 namespace {
@@ -15,9 +18,10 @@ constexpr int kMostWorkers = 2;
 // One miniature to be made. The main loop owns it but for `pixels`, which is the worker's until it has ended.
 struct thumbnail_request {
   Evas_Object *widget;  // null once it is deleted
-  std::string path;
-  int side;           // pixels
-  double asked_time;  // of the main loop's turn
+  std::string path;     // of the picture
+  bool is_video;        // whose picture it is
+  int side;             // pixels
+  double asked_time;    // of the main loop's turn
   tavro_thumbnail_pixels pixels;
 };
 
@@ -61,10 +65,10 @@ void _work_ended_cb(void *data, Ecore_Thread *) {
   if (request->widget) {
     evas_object_event_callback_del_full(request->widget, EVAS_CALLBACK_DEL, _widget_deleted_cb,
                                         request.get());
-    if (request->pixels.empty())
-      elm_object_signal_emit(request->widget, "tavro,unreadable", "tavro");
-    else
+    if (!request->pixels.empty())
       _show_pixels(request->widget, *request);
+    else if (!request->is_video)
+      elm_object_signal_emit(request->widget, "tavro,unreadable", "tavro");
   }
   _serve_waiting();
 }
@@ -81,14 +85,26 @@ void _serve_waiting() {
   }
 }
 
-void _request(Evas_Object *widget, const char *path, int side) {
+void _request(Evas_Object *widget, const std::string &path, bool is_video, int units) {
   static const bool has_folder = tavro_create_dir(TAVRO_THUMBNAIL_FOLDER) == 0;
   (void)has_folder;  // without it nothing is cached
-  auto request =
-      std::make_unique<thumbnail_request>(thumbnail_request{widget, path, side, ecore_loop_time_get(), {}});
+  const int side = static_cast<int>(units * elm_config_scale_get());
+  auto request = std::make_unique<thumbnail_request>(
+      thumbnail_request{widget, path, is_video, side, ecore_loop_time_get(), {}});
   evas_object_event_callback_add(widget, EVAS_CALLBACK_DEL, _widget_deleted_cb, request.get());
   _waiting.push_back(std::move(request));
   _serve_waiting();
+}
+
+// What is no recording of the screen has no picture, and keeps the plain tile.
+void _show_video(Evas_Object *widget, const char *path, int units) {
+  elm_object_signal_emit(widget, "tavro,video", "tavro");
+  const std::string length = tavro_video_length_text(tavro_video_seconds(path));
+  if (!length.empty()) elm_object_signal_emit(widget, "tavro,length", "tavro");
+  tavro_layout_text_set(widget, nullptr, length.c_str());
+  const std::string picture = tavro_video_picture_path(path);
+  struct stat info {};
+  if (lstat(picture.c_str(), &info) == 0 && S_ISREG(info.st_mode)) _request(widget, picture, true, units);
 }
 
 }  // namespace
@@ -97,8 +113,8 @@ Evas_Object *tavro_thumbnail_add(Evas_Object *parent, const char *path, int unit
   Evas_Object *widget = tavro_layout_add(parent, "tavro/thumbnail");
   if (!path) return widget;
   if (tavro_gallery_is_video(path))
-    elm_object_signal_emit(widget, "tavro,video", "tavro");
+    _show_video(widget, path, units);
   else
-    _request(widget, path, static_cast<int>(units * elm_config_scale_get()));
+    _request(widget, path, false, units);
   return widget;
 }

@@ -16,6 +16,7 @@
 #include "tavro_picture_info.h"
 #include "tavro_save_copy.h"
 #include "tavro_screens.h"
+#include "tavro_video_info.h"
 #include "tavro_widgets.h"
 
 namespace {
@@ -206,7 +207,9 @@ void _build_video(viewer *state, const char *name) {
   if (size < 0) return _show_message(state, "IDS_OB_BODY_FILE_NOT_READABLE");
   Evas_Object *tile = tavro_layout_add(state->page, "tavro/viewer/video");
   elm_object_part_content_set(tile, "tavro.swallow.icon", tavro_icon_add(tile, "video/large"));
-  tavro_layout_text_set(tile, nullptr, (std::string(name) + "\n" + tavro_size_text(size)).c_str());
+  const std::string length = tavro_video_length_text(tavro_video_seconds(state->path));
+  const std::string facts = (length.empty() ? "" : length + " · ") + tavro_size_text(size);
+  tavro_layout_text_set(tile, nullptr, (std::string(name) + "\n" + facts).c_str());
   elm_object_content_set(tile, tavro_button_add(tile, "tavro_primary", tavro_text("IDS_OB_BUTTON_OPEN"),
                                                 nullptr, nullptr, _open_video_cb, state));
   elm_object_content_set(state->page, tile);

@@ -6,7 +6,6 @@
 #include <algorithm>
 
 #include "json_fields.h"
-#include "secret.h"
 #include "svc_log.h"
 
 namespace {
@@ -15,32 +14,6 @@ constexpr int64_t kPieceBytes = 1024 * 1024;
 constexpr int64_t kLargestFile = 64 * 1024 * 1024;  // bytes; what the desk takes
 constexpr int kMostFiles = 32;
 constexpr int kMostFaults = 2;
-
-// A checksum being made on a worker thread; the finished text comes back to the main loop.
-struct ChecksumJob {
-  std::shared_ptr<UniqueFd> fd;
-  int64_t size;
-  std::function<void(const std::string &)> then;
-};
-
-void _checksum_thread(GTask *task, gpointer, gpointer data, GCancellable *) {
-  auto *job = static_cast<ChecksumJob *>(data);
-  const auto sha256 = sha256_of_file(job->fd->get(), job->size);
-  g_task_return_pointer(task, g_strdup(sha256 ? sha256->c_str() : ""), g_free);
-}
-
-void _checksum_cb(GObject *, GAsyncResult *result, gpointer data) {
-  GCharPtr sha256(static_cast<char *>(g_task_propagate_pointer(G_TASK(result), nullptr)));
-  static_cast<ChecksumJob *>(data)->then(sha256 ? sha256.get() : "");
-}
-
-void _make_checksum(std::shared_ptr<UniqueFd> fd, int64_t size,
-                    std::function<void(const std::string &)> then) {
-  auto *job = new ChecksumJob{std::move(fd), size, std::move(then)};
-  GObjectPtr<GTask> task(g_task_new(nullptr, nullptr, _checksum_cb, job));
-  g_task_set_task_data(task.get(), job, [](gpointer memory) { delete static_cast<ChecksumJob *>(memory); });
-  g_task_run_in_thread(task.get(), _checksum_thread);
-}
 
 // Opens a file for sending. Null with the reason when it is none that can be sent.
 std::shared_ptr<UniqueFd> _open(const SvcFile &file, int64_t &size, const char *&why) {
@@ -88,16 +61,18 @@ void SvcUpload::next_file() {
 }
 
 void SvcUpload::open_file() {
+  const SvcFile &file = report_.files[position_];
+  int64_t size = 0;
   const char *why = nullptr;
-  current_.fd = _open(report_.files[position_], current_.size, why);
+  auto fd = _open(file, size, why);
   if (why) return skip_file(why);
-  _make_checksum(current_.fd, current_.size,
-                 [self = shared_from_this()](const std::string &sha256) { self->on_checksum(sha256); });
+  svc_make_content(std::move(fd), size, file.kind == "attachment",
+                   [self = shared_from_this()](const SvcContent &content) { self->on_content(content); });
 }
 
-void SvcUpload::on_checksum(const std::string &sha256) {
-  if (sha256.empty()) return skip_file("it cannot be read");
-  current_.sha256 = sha256;
+void SvcUpload::on_content(const SvcContent &content) {
+  if (content.why) return skip_file(content.why);
+  current_.content = content;
   ask_state();
 }
 
@@ -108,34 +83,34 @@ DeskCall SvcUpload::call_for_file(const char *method) const {
   call.method = method;
   call.path = "/reports/" + std::to_string(server_id_) + "/attachments/" + std::to_string(file.number) +
               "?name=" + name.get() + "&kind=" + file.kind;
-  call.headers.emplace_back("X-Content-SHA256", current_.sha256);
+  call.headers.emplace_back("X-Content-SHA256", current_.content.sha256);
   return call;
 }
 
 void SvcUpload::ask_state() {
   desk_.call(call_for_file("GET"), [self = shared_from_this()](const DeskReply &reply) {
-    const bool is_known = reply.is_ok() && text_field(reply.body, "sha256") == self->current_.sha256;
+    const bool is_known = reply.is_ok() && text_field(reply.body, "sha256") == self->current_.content.sha256;
     if (is_known && flag_field(reply.body, "complete")) return self->on_piece(reply);
     // 404: nothing there yet; 422: what was there was wrong and is gone.
     if (!reply.is_ok() && reply.status != 404 && reply.status != 422) return self->end(reply, "asking");
     const int64_t there = is_known ? number_field(reply.body, "received") : 0;
-    self->send_piece(there > 0 && there < self->current_.size ? there : 0);
+    self->send_piece(there > 0 && there < self->current_.content.size ? there : 0);
   });
 }
 
 void SvcUpload::send_piece(int64_t offset) {
   current_.offset = offset;
-  const auto size = static_cast<size_t>(std::min(kPieceBytes, current_.size - offset));
+  const auto size = static_cast<size_t>(std::min(kPieceBytes, current_.content.size - offset));
   DeskCall call = call_for_file("PUT");
   call.content_type = "application/octet-stream";
   call.body.resize(size);
   if (size > 0) {
-    const ssize_t got = pread(current_.fd->get(), call.body.data(), size, offset);
+    const ssize_t got = pread(current_.content.fd->get(), call.body.data(), size, offset);
     if (got != static_cast<ssize_t>(size)) return skip_file("it became shorter while it was sent");
     const auto last = offset + static_cast<int64_t>(size) - 1;
-    call.headers.emplace_back(
-        "Content-Range",
-        "bytes " + std::to_string(offset) + "-" + std::to_string(last) + "/" + std::to_string(current_.size));
+    call.headers.emplace_back("Content-Range", "bytes " + std::to_string(offset) + "-" +
+                                                   std::to_string(last) + "/" +
+                                                   std::to_string(current_.content.size));
   }
   desk_.call(std::move(call), [self = shared_from_this()](const DeskReply &reply) { self->on_piece(reply); });
 }
@@ -148,7 +123,7 @@ void SvcUpload::on_piece(const DeskReply &reply) {
     return open_file();  // its content may be another one by now
   }
   // Anything but progress ends this attempt, or a confused desk would get the same piece for ever.
-  const bool has_progress = received > current_.offset && received < current_.size;
+  const bool has_progress = received > current_.offset && received < current_.content.size;
   if (reply.is_ok() && !flag_field(reply.body, "complete") && has_progress) return send_piece(received);
   const bool has_older_content = reply.status == 409;
   if (!has_older_content && !(reply.is_ok() && flag_field(reply.body, "complete")))

@@ -11,6 +11,7 @@
 #include <string>
 #include <vector>
 
+#include "svc_content.h"
 #include "svc_desk_link.h"
 #include "svc_report.h"
 
@@ -32,9 +33,7 @@ class SvcUpload : public std::enable_shared_from_this<SvcUpload> {
  private:
   // The file that is being sent.
   struct Current {
-    std::shared_ptr<UniqueFd> fd;
-    int64_t size = 0;  // bytes, as of the checksum; what is written behind later is not sent
-    std::string sha256;
+    SvcContent content;
     int64_t offset = 0;  // where the piece under way starts
     int faults = 0;      // times that the desk refused its content or position
   };
@@ -43,7 +42,7 @@ class SvcUpload : public std::enable_shared_from_this<SvcUpload> {
   void on_announced(const DeskReply &reply);
   void next_file();
   void open_file();
-  void on_checksum(const std::string &sha256);
+  void on_content(const SvcContent &content);
   void ask_state();
   void send_piece(int64_t offset);
   void on_piece(const DeskReply &reply);

@@ -9,10 +9,9 @@ import zipfile
 
 import pytest
 
-from phone_driver import Phone, wait_until
+from phone_driver import CLIENT, Phone, wait_until
 from road import Road
 
-CLIENT = "corvane.tavro-lite"
 HINT = "What were you doing when it stopped?"
 MEGABYTE = 1024 * 1024
 
@@ -159,11 +158,9 @@ def test_a_killed_crash_report_comes_back_and_goes_without_too_large_a_dump(road
     crash(road, "org.example.big", "Big", TAVRO_CRASH_FOLDER="gone_1_2")  # again, while that is collected
     road.screen.wait_for("About: Big", timeout=20)
     assert "tavro_dd.zip" in road.screen.description("Crash dump")
-    kept = road.phone.storage() / "apps" / CLIENT / "shared/data/.tavro.compose"
+    kept = road.phone.data() / ".tavro.compose"
     wait_until(lambda: kept.exists() and "tavro_dd.zip" in kept.read_text(), what="the report being kept")
-    killed = client(road)
-    road.phone.execute("kill", "-9", str(killed))
-    wait_until(lambda: client(road) != killed, what="the client being gone")
+    road.phone.end()
     road.phone.launch()
     road.screen.activate("Go on")
     assert "tavro_dd.zip" in road.screen.description("Crash dump")

@@ -5,7 +5,7 @@ import time
 
 import pytest
 import stored_reports
-from phone_driver import Phone, wait_until
+from phone_driver import wait_until
 from road import IN_PROCESS, Road
 
 SOLVED, COMPLETED = 3, 4
@@ -25,13 +25,6 @@ class DetailsRoad(Road):
             self.open_history()
         self.screen.activate(self.wait_for_row(*row))
 
-    def kill_client(self):
-        client = self.phone.status()["corvane.tavro-lite"]
-        self.phone.execute("kill", "-9", str(client))
-        wait_until(lambda: self.phone.status().get("corvane.tavro-lite") != client, what="the client being gone")
-        self.phone.launch()
-        self.screen.wait_for("Report a problem")
-
     def scroll_to_end(self, wheel="5"):
         self.phone.execute("xdotool", "mousemove", "360", "700", "click", "--repeat", "60", "--delay", "5", wheel)
 
@@ -49,11 +42,7 @@ class DetailsRoad(Road):
 
 @pytest.fixture(scope="module")
 def road():
-    with Phone() as phone:
-        phone.start("--accessible")
-        road = DetailsRoad(phone)
-        road.choose_account()
-        road.add_pictures("morning.png", "banner.jpg")
+    with DetailsRoad.started("morning.png", "banner.jpg") as road:
         road.write_problem("Battery", TITLE, "")
         road.attach("morning.png", "banner.jpg")
         road.screen.type_text("What happened? What did you expect?", TEXT)
@@ -99,9 +88,9 @@ def test_picture_opens_and_is_saved_beside_what_is_there(road):
 def test_follow_up_reaches_support_in_the_conversation_of_the_first_report(road):
     road.screen.activate("Still happens")
     road.screen.type_text(HINT, "Last <summer>'s album is grey.")
-    note = road.phone.storage() / "apps/corvane.tavro-lite/shared/data/.tavro.follow_up"
+    note = road.phone.data() / ".tavro.follow_up"
     wait_until(lambda: note.exists() and "<summer>" in note.read_text(), what="what was typed being kept")
-    road.kill_client()
+    road.relaunch()
     road.open(TITLE, "Completed")
     road.screen.activate("Still happens")
     assert road.screen.text(HINT) == "Last <summer>'s album is grey.", "the killed client lost what was typed"

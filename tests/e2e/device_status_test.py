@@ -4,13 +4,13 @@ played on the machine's system bus, everything else is real."""
 import contextlib
 import json
 import re
-import sqlite3
 import subprocess
 
 import dbus
 import pytest
 
-from phone_driver import ROOT, Phone, wait_until
+import stored_reports
+from phone_driver import ROOT, wait_until
 from road import Road
 
 UPOWER = "org.freedesktop.UPower"
@@ -71,10 +71,7 @@ def machine():
 
 @pytest.fixture(scope="module")
 def road(machine):
-    with Phone(environment={"DBUS_SYSTEM_BUS_ADDRESS": machine.address}) as phone:
-        phone.start("--accessible")
-        road = Road(phone)
-        road.choose_account()
+    with Road.started(environment={"DBUS_SYSTEM_BUS_ADDRESS": machine.address}) as road:
         yield road
 
 
@@ -88,21 +85,13 @@ def device_status(road, title):
     return road.desk.page(f"/staff/reports/{report['id']}/files/{files[0]['number']}").splitlines()
 
 
-def open_review(road):
-    road.screen.activate("More")
-    road.screen.activate("What is sent")
-    road.screen.wait_for("Your text")
-
-
 def drafts(phone):
-    path = phone.storage() / "apps/corvane.tavro-lite/shared/data/.tavro.db"
-    with contextlib.closing(sqlite3.connect(path, timeout=5)) as store:
-        return [number for number, in store.execute("SELECT VOC_ID FROM TABLE_VOC WHERE VOC_STATE = '6'")]
+    return stored_reports.column(phone, "SELECT VOC_ID FROM TABLE_VOC WHERE VOC_STATE = '6'")
 
 
 def test_without_hardware_the_status_has_zeros_and_no_network(road):
     road.write_problem("Something else", "A phone without hardware", "on a table")
-    open_review(road)
+    road.open_review()
     road.screen.activate("Device status")
     road.screen.wait_for("Copy")
     shown = road.screen.text("Device status", "entry")
@@ -133,7 +122,7 @@ def test_battery_and_each_network_with_a_name_have_their_line(road, machine):
 
 def test_device_status_that_the_person_takes_off_stays_on_the_phone(road):
     road.write_problem("Something else", "Nothing of the phone", "please")
-    open_review(road)
+    road.open_review()
     for button in ("Remove", "Put back", "Remove"):
         road.screen.activate(button + " Device status")
     road.screen.wait_for("Put back Device status")

@@ -1,15 +1,12 @@
 """Launch requests from outside, every operation, to a client that runs and to one that does not: what it asks the
 upload service for, what it logs, what it shows and whether it ends."""
 
-import contextlib
-import sqlite3
-
 import pytest
 
+import stored_reports
 from bus_watch import BusWatch
-from phone_driver import Phone, Screen, wait_until
+from phone_driver import CLIENT, Phone, Screen, wait_until
 
-CLIENT = "corvane.tavro-lite"
 SHARE = "http://tizen.org/appcontrol/operation/share"
 NEWS = ["TAVRO_OPERATION_TYPE_APP_UPDATE", "TAVRO_OPERATION_TYPE_GET_BETA_URLS", "TAVRO_OPERATION_TYPE_GET_MAX_LIMIT"]
 START = ["TAVRO_OPERATION_TYPE_GET_USER_BETA_STATUS", "TAVRO_OPERATION_TYPE_GET_MODEL_ALIAS_STATUS"]
@@ -77,31 +74,18 @@ class World:
             return place
         wait_until(position, 30, lambda: f"{lines} in\n{self.log()}")
 
-    def end_client(self):
-        client = self.client()
-        if client:
-            self.phone.execute("kill", "-9", str(client), check=False)
-        self.wait_for_end()
-
     def wait_for_end(self):
         wait_until(lambda: not self.client(), 30, "the client being gone")
 
     def notified(self):
         return self.watch.notifications(self.message_count)
 
-    @contextlib.contextmanager
-    def store(self):
-        path = self.phone.storage() / "apps" / CLIENT / "shared/data/.tavro.db"
-        with contextlib.closing(sqlite3.connect(path, timeout=10)) as store:
-            yield store
-            store.commit()
-
     def add_report(self):
         """An answered report of the person, unread, with a system log: its id and the log's path."""
         log = self.phone.storage() / "media/QRT_debug/sent.zip"
         log.parent.mkdir(parents=True, exist_ok=True)
         log.write_text("log")
-        with self.store() as store:
+        with stored_reports.connect(self.phone) as store, store:
             voc_id = store.execute(
                 "INSERT INTO TABLE_VOC(VOC_TYPE, VOC_TEXT, VOC_APP_NAME, VOC_STATE, VOC_PUSH_COMMENTS, VOC_PUSH_READ, "
                 "VOC_USER_NAME, VOC_DATE_OF_CREATION, VOC_DATE_OF_UPDATION) VALUES('BUG', 'no sound', 'Hardware', "
@@ -125,9 +109,7 @@ def account(world):
     """Somebody is signed in after a test that signs out, and has no reports."""
     yield
     world.sign_in()
-    with world.store() as store:
-        for table in ("TABLE_VOC", "TABLE_VOC_EXTENDED"):
-            store.execute(f"DELETE FROM {table}")
+    stored_reports.remove_all_reports(world.phone)
 
 
 def check_asked(world, *further):
@@ -142,7 +124,7 @@ def check_asked(world, *further):
 @pytest.mark.parametrize("is_running", [True, False], ids=["running", "alone"])
 def test_every_operation_asks_for_news_first_and_does_what_its_row_says(world, operation, lines, is_running):
     if not is_running:
-        world.end_client()
+        world.phone.end()
     client = world.client()
     world.begin()
     world.phone.launch(operation=operation)
@@ -191,7 +173,7 @@ MESSAGES = {
 @pytest.mark.usefixtures("account")
 def test_a_message_does_its_work_in_order_and_a_client_started_for_it_ends(world, name):
     extras, is_signed_in, lines, notes, is_log_gone = MESSAGES[name]
-    world.end_client()
+    world.phone.end()
     voc_id, log = world.add_report()
     if not is_signed_in:
         world.phone.preference("unset", "tavro_username")
@@ -249,10 +231,10 @@ def test_log_out_keeps_what_is_being_written_and_goes_back_to_the_account_page(w
     assert not world.screen.look("Title")
     for key in ("tavro_username", "tavro_cookie_val"):
         assert world.phone.preference("get", key, check=False) == ""
-    with world.store() as store:
+    with stored_reports.connect(world.phone) as store, store:
         assert store.execute("SELECT VOC_TITLE_TEXT, VOC_STATE, VOC_USER_NAME FROM TABLE_VOC JOIN TABLE_VOC_EXTENDED "
                              "USING (VOC_ID)").fetchall() == [("Half a report", "6", "anna")]
-    world.end_client()
+    world.phone.end()
     world.begin()
     world.phone.launch(operation="TAVRO_USER_LOGOUT")
     check_asked(world)
@@ -286,7 +268,7 @@ def test_a_touched_notification_without_a_report_uncovers_the_history(world):
 
 
 def test_a_request_of_a_crash_and_values_that_make_no_sense_leave_the_client_in_order(world):
-    world.end_client()
+    world.phone.end()
     world.phone.launch()
     world.screen.wait_for("Report a problem")
     client = world.client()

@@ -5,7 +5,7 @@ import pytest
 
 import stored_reports as stored
 from keyboard_test import Keyboard
-from phone_driver import Phone, wait_until
+from phone_driver import wait_until
 
 SEARCH = "Search in your reports"
 REFRESHED = "Called for status update from svc"
@@ -13,10 +13,7 @@ REFRESHED = "Called for status update from svc"
 
 @pytest.fixture(scope="module")
 def road():
-    with Phone() as phone:
-        phone.start("--accessible")
-        keyboard = Keyboard(phone)
-        keyboard.choose_account()
+    with Keyboard.started() as keyboard:
         keyboard.open_history()
         yield keyboard
 
@@ -57,8 +54,7 @@ def start_selecting(road):
 
 
 def long_press(road, row):
-    x, y, width, height = road.place(road.screen.find(row))
-    road.phone.execute("xdotool", "mousemove", str(x + width // 2), str(y + height // 2), "mousedown", "1")
+    road.phone.execute("xdotool", "mousemove", *road.screen.middle(road.screen.find(row)), "mousedown", "1")
     road.screen.wait_for("Cancel")
     road.phone.execute("xdotool", "mouseup", "1")
 

@@ -1,15 +1,11 @@
 """Nothing that was typed is lost, whatever ends the client; and what other applications share with it."""
 
-import contextlib
-import signal
-import sqlite3
-
 import pytest
 
-from phone_driver import Phone, wait_until
+import stored_reports
+from phone_driver import CLIENT, wait_until
 from road import Road
 
-CLIENT = "corvane.tavro-lite"
 HINT = "What happened? What did you expect?"
 SHARE = "http://tizen.org/appcontrol/operation/share"
 PATH = "http://tizen.org/appcontrol/data/path"
@@ -17,11 +13,7 @@ PATH = "http://tizen.org/appcontrol/data/path"
 
 @pytest.fixture(scope="module")
 def road():
-    with Phone() as phone:
-        phone.start("--accessible")
-        road = Road(phone)
-        road.choose_account()
-        road.add_pictures("morning.png", "banner.jpg")
+    with Road.started("morning.png", "banner.jpg") as road:
         yield road
 
 
@@ -31,32 +23,14 @@ def landing_page(road):
     road.phone.launch()
     road.screen.wait_for("Report a problem")
     yield
-    end(road, signal.SIGKILL)
-    for path in kept_files(road):
+    road.phone.end()
+    for path in road.kept_files():
         path.unlink()
 
 
-def kept_files(road):
-    folder = road.phone.directory / "usr/apps" / CLIENT / "shared/data"
-    return sorted(folder.glob(".tavro.compose*"))
-
-
-def wait_until_kept(road, text):
-    wait_until(lambda: any(text in path.read_text() for path in kept_files(road)), 10, f"'{text}' being kept")
-
-
-def end(road, how):
-    client = road.phone.status().get(CLIENT)
-    if client:
-        road.phone.execute("kill", f"-{int(how)}", str(client), check=False)
-        wait_until(lambda: road.phone.status().get(CLIENT) != client, 10, "the client being gone")
-
-
 def drafts(road):
-    path = road.phone.directory / "usr/apps" / CLIENT / "shared/data/.tavro.db"
-    with contextlib.closing(sqlite3.connect(path, timeout=5)) as store:
-        return [title for title, in store.execute("SELECT VOC_TITLE_TEXT FROM TABLE_VOC JOIN TABLE_VOC_EXTENDED "
-                                                  "USING (VOC_ID) WHERE VOC_STATE = '6'")]
+    return stored_reports.column(road.phone, "SELECT VOC_TITLE_TEXT FROM TABLE_VOC JOIN TABLE_VOC_EXTENDED "
+                                             "USING (VOC_ID) WHERE VOC_STATE = '6'")
 
 
 def share(road, *words, uri=None):
@@ -64,18 +38,18 @@ def share(road, *words, uri=None):
     road.phone.command("launch", CLIENT, "--operation", SHARE, *options, *words)
 
 
-@pytest.mark.parametrize("how", [signal.SIGKILL, signal.SIGSEGV])
+@pytest.mark.parametrize("how", ["KILL", "SEGV"])
 def test_killed_while_writing_goes_on_where_it_was(road, how):
     text = "It's <b>loud</b> &amp;\nsince \U0001F600"
-    road.write_problem("Hardware", f"Kept after {how.name}", text)
+    road.write_problem("Hardware", f"Kept after {how}", text)
     road.attach("banner.jpg", "morning.png")
-    wait_until_kept(road, "morning.png")
-    end(road, how)
+    road.wait_until_kept("morning.png")
+    road.phone.end(how=how)
     road.phone.launch()
     road.screen.wait_for("Go on writing?")
     road.screen.activate("Go on")
     road.screen.wait_for("About: Hardware")
-    assert road.screen.text("Title") == f"Kept after {how.name}"
+    assert road.screen.text("Title") == f"Kept after {how}"
     assert road.screen.text(HINT) == text
     for name in ("banner.jpg", "morning.png"):
         assert [shown for shown in road.screen.names() if name in shown], name
@@ -84,25 +58,25 @@ def test_killed_while_writing_goes_on_where_it_was(road, how):
 
 def test_kept_as_a_draft_it_waits_in_the_history_once(road):
     road.write_idea("Something else", "An idea that waits", "to be told")
-    wait_until_kept(road, "to be told")
-    end(road, signal.SIGKILL)
+    road.wait_until_kept("to be told")
+    road.phone.end()
     # A message wakes the client, which ends again without having shown or lost anything.
     road.phone.launch(operation="TAVRO_UPDATE_HISTORY", TAVRO_SERVER_UPLOAD_STATUS="none")
-    assert kept_files(road)
+    assert road.kept_files()
     road.phone.launch()
     road.screen.activate("Keep as draft")
     road.screen.wait_gone("Go on writing?")
     assert drafts(road) == ["An idea that waits"]
-    assert not kept_files(road)
+    assert not road.kept_files()
     road.open_history()
     road.wait_for_row("An idea that waits", "Draft saved")
 
 
 def test_an_orderly_end_stores_a_draft_and_asks_nothing(road):
     road.write_problem("Battery", "Phone switched off", "while writing")
-    wait_until_kept(road, "while writing")
-    end(road, signal.SIGTERM)  # off the bus before it has stored
-    wait_until(lambda: not kept_files(road), 10, "nothing being kept")
+    road.wait_until_kept("while writing")
+    road.phone.end(how="TERM")  # off the bus before it has stored
+    wait_until(lambda: not road.kept_files(), 10, "nothing being kept")
     assert "Phone switched off" in drafts(road)
     road.phone.launch()
     road.screen.wait_for("Report a problem")
@@ -110,7 +84,7 @@ def test_an_orderly_end_stores_a_draft_and_asks_nothing(road):
 
 
 def test_shared_files_wait_for_an_account_and_bad_ones_are_named(road):
-    end(road, signal.SIGKILL)
+    road.phone.end()
     road.phone.preference("unset", "tavro_username")
     media = road.phone.storage() / "media"
     (media / "notes.txt").write_text("no picture")

@@ -2,15 +2,14 @@
 
 import contextlib
 import re
-import sqlite3
 import subprocess
 
 import pytest
 
-from phone_driver import BUILD, Phone, wait_until
+import stored_reports
+from phone_driver import Phone, wait_until
 from road import Road
 
-CLIENT = "corvane.tavro-lite"
 HINT = "What happened? What did you expect?"
 
 # A screen reader that consumes the keys named on its command line, and writes down all that it hears.
@@ -34,7 +33,7 @@ Atspi.event_main()
 
 class Keyboard(Road):
     def press(self, *keys):
-        self.phone.execute(str(BUILD / "tests" / "press_keys"), *keys)
+        self.phone.press(*keys)
 
     def _focused_nodes(self):
         state = self.screen.atspi.StateType.FOCUSED
@@ -221,29 +220,21 @@ def test_keys_go_on_when_the_registry_is_gone(keyboard):
 
 
 def test_a_phone_without_a_screen_reader_takes_keys_the_same_way():
-    def titles():
-        path = phone.storage() / "apps" / CLIENT / "shared/data/.tavro.db"
-        with contextlib.closing(sqlite3.connect(path, timeout=5)) as store:
-            return [title for title, in store.execute("SELECT VOC_TITLE_TEXT FROM TABLE_VOC_EXTENDED")]
-
-    def press(*keys):
-        phone.execute(str(BUILD / "tests" / "press_keys"), *keys)
-
     def has_typed():
-        press("z")
-        return (phone.storage() / "apps" / CLIENT / "shared/data/.tavro.compose").exists()
+        phone.press("z")
+        return (phone.data() / ".tavro.compose").exists()
     with Phone() as phone:
         phone.start("--no-client")
         phone.preference("set", "tavro_username", "string", "ann")
         phone.launch()
         wait_until(lambda: re.search("id # 0x[1-9a-f]", phone.execute("xprop", "-root", "_NET_ACTIVE_WINDOW").stdout),
                    what="the window")
-        press("Return")
+        phone.press("Return")
         wait_until(has_typed, what="a text in the title field")
-        press("Escape")
+        phone.press("Escape")
 
         # Enter is nobody's until the popup has the focus.
         def has_stored():
-            press("Return")
-            return titles()
+            phone.press("Return")
+            return stored_reports.titles(phone)
         assert set(wait_until(has_stored, what="the draft")[0]) == {"z"}

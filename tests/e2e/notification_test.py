@@ -12,10 +12,9 @@ import pytest
 import stored_reports as stored
 from desktop import Desktop
 from keyboard_test import Keyboard
-from phone_driver import Phone, wait_until
+from phone_driver import CLIENT, Phone, wait_until
 from road import IN_PROCESS
 
-CLIENT = "corvane.tavro-lite"
 NAME, PATH = "org.freedesktop.Notifications", "/org/freedesktop/Notifications"
 PREFERENCES, STORE = "dbspace/preference.db", f"apps/{CLIENT}/shared/data/.tavro.db"
 MOCK = "org.freedesktop.DBus.Mock"
@@ -125,13 +124,6 @@ def wait_for_report(road):
     road.screen.wait_for("is <b>black</b> & cold")
 
 
-def end_client(road):
-    client = road.phone.status().get(CLIENT)
-    if client:
-        road.phone.execute("kill", str(client), check=False)
-        wait_until(lambda: CLIENT not in road.phone.status(), 20, "the client being gone")
-
-
 def answer(road, report, text):
     road.notifications.forget()
     road.desk.answer(report["desk"], IN_PROCESS, text)
@@ -193,7 +185,7 @@ def test_nothing_is_told_about_a_report_that_is_being_deleted(road, report):
 
 
 def test_an_answer_to_a_client_that_does_not_run_opens_the_report_when_touched(road, report):
-    end_client(road)
+    road.phone.end(how="TERM")
     number = answer(road, report, "It is mended")
     wait_until(lambda: CLIENT not in road.phone.status(), 20, "the end of the client that only brought the answer")
     road.notifications.wait_for_badge(1)
@@ -204,7 +196,7 @@ def test_an_answer_to_a_client_that_does_not_run_opens_the_report_when_touched(r
 
 
 def test_a_touch_leaves_what_is_being_written_where_it_was(road, report):
-    end_client(road)
+    road.phone.end(how="TERM")
     number = answer(road, report, "While you write")
     road.phone.launch()
     road.write_problem("Something else", "Half", "a thought")
@@ -235,7 +227,7 @@ def test_news_that_are_about_no_report_bring_their_ids_back_unless_they_are_swit
 
 
 def test_without_a_service_toasts_are_in_the_window_and_the_next_service_begins_anew(road, report):
-    end_client(road)
+    road.phone.end(how="TERM")
     answer(road, report, "Before the end")
     road.notifications.stop()
     wait_until(lambda: not rows(road, PREFERENCES, "SELECT id FROM posted_notification"), 20, "nothing being shown")
@@ -252,7 +244,7 @@ def test_without_a_service_toasts_are_in_the_window_and_the_next_service_begins_
 
 
 def test_a_touch_for_a_deleted_report_says_so_and_shows_the_history(road, report):
-    end_client(road)
+    road.phone.end(how="TERM")
     number = answer(road, report, "Too late")
     rows(road, STORE, f"DELETE FROM TABLE_VOC WHERE VOC_ID = {report['phone']}")
     road.notifications.touch(number)

@@ -11,6 +11,7 @@ import time
 
 ROOT = pathlib.Path(__file__).resolve().parents[2]
 BUILD = pathlib.Path(os.environ.get("TAVRO_BUILD_DIR", ROOT / "build" / "debug"))
+CLIENT = "corvane.tavro-lite"
 
 
 def wait_until(condition, timeout=20.0, what="the condition"):
@@ -66,10 +67,17 @@ class Phone:
         parts = (line.split(": runs, pid ") for line in lines if ": runs, pid " in line)
         return {name: int(pid) for name, pid in parts}
 
+    def end(self, app_id=CLIENT, how="KILL"):
+        """Send the application the signal, if it runs, and wait until it is gone."""
+        process = self.status().get(app_id)
+        if process:
+            self.execute("kill", f"-{how}", str(process), check=False)
+            wait_until(lambda: self.status().get(app_id) != process, what=f"the end of {app_id}")
+
     def execute(self, *command, check=True):
         return self.command("exec", "--", *command, check=check)
 
-    def launch(self, app_id="corvane.tavro-lite", operation=None, reply=False, **extra_data):
+    def launch(self, app_id=CLIENT, operation=None, reply=False, **extra_data):
         options = ["--operation", operation] if operation else []
         options += ["--reply"] if reply else []
         return self.command("launch", *options, app_id, *(f"{k}={v}" for k, v in extra_data.items())).stdout
@@ -95,6 +103,13 @@ class Phone:
         lines = (self.directory / "run" / "state").read_text().splitlines()
         return pathlib.Path(dict(line.split("=", 1) for line in lines)["usr"])
 
+    def data(self):
+        """The folder of what the client keeps."""
+        return self.storage() / "apps" / CLIENT / "shared/data"
+
+    def press(self, *keys):
+        self.execute(str(BUILD / "tests" / "press_keys"), *keys)
+
     def output(self):
         """What the phone's programs wrote to standard error."""
         path = self.directory / "run" / "output.log"
@@ -105,7 +120,7 @@ class Screen:
     """What a screen reader sees of the phone, which must have been started with --accessible. One per process:
     the accessibility library keeps its first connection."""
 
-    def __init__(self, phone, application="corvane.tavro-lite"):
+    def __init__(self, phone, application=CLIENT):
         os.environ["DBUS_SESSION_BUS_ADDRESS"] = phone.state["bus"]
         os.environ.pop("AT_SPI_BUS_ADDRESS", None)
         os.environ.pop("DISPLAY", None)  # the library would look for another bus there
@@ -181,6 +196,11 @@ class Screen:
         selection = node.get_parent().get_selection_iface()
         assert selection, f"'{name}' ({node.get_role_name()}) has no action but {names}"
         assert selection.select_child(node.get_index_in_parent()), f"'{name}' could not be selected"
+
+    def middle(self, node):
+        """Where a finger touches it: x and y in the window, which fills the screen, as texts."""
+        box = node.get_component_iface().get_extents(self.atspi.CoordType.WINDOW)
+        return str(box.x + box.width // 2), str(box.y + box.height // 2)
 
     def description(self, name, timeout=10.0):
         return self.find(name, None, timeout).get_description()

@@ -1,11 +1,10 @@
 """Choosing what a report is about and which files go with it, as a person does it."""
 
-import contextlib
 import os
-import sqlite3
 
 import pytest
-from phone_driver import Phone, wait_until
+import stored_reports
+from phone_driver import wait_until
 from road import Road
 
 APPLICATIONS = ["Gallery", "Messages", "Éditeur", "100% <b>bold</b>", "Clock"]
@@ -20,10 +19,7 @@ def road(tmp_path_factory):
         icon.write_bytes(b"no picture")
         (data / "applications" / f"demo{number}.desktop").write_text(
             f"[Desktop Entry]\nType=Application\nName={name}\nExec=true\nIcon={icon}\n")
-    with Phone(environment={"XDG_DATA_HOME": str(data)}) as phone:
-        phone.start("--accessible")
-        road = Road(phone)
-        road.choose_account()
+    with Road.started(environment={"XDG_DATA_HOME": str(data)}) as road:
         yield road
 
 
@@ -39,9 +35,7 @@ def open_gallery(road):
 
 
 def tap(road, name):
-    box = road.screen.find(name).get_component_iface().get_extents(1)  # in the window, which fills the screen
-    x, y = str(box.x + box.width // 2), str(box.y + box.height // 2)
-    road.phone.execute("xdotool", "mousemove", x, y, "click", "1")
+    road.phone.execute("xdotool", "mousemove", *road.screen.middle(road.screen.find(name)), "click", "1")
 
 
 def sought(road, text):
@@ -82,12 +76,8 @@ def test_performance_has_a_page_of_its_own_that_returns_to_the_report(road):
 
 
 def test_the_stores_table_learns_what_is_installed(road):
-    store = road.phone.storage() / "apps/corvane.tavro-lite/shared/data/.tavro.db"
-
     def downloaded():
-        with contextlib.closing(sqlite3.connect(store, timeout=5)) as table:
-            rows = table.execute("SELECT APP_NAME FROM APP_DATA WHERE APP_DOWNLOADED = 1").fetchall()
-        return {name for name, in rows}
+        return set(stored_reports.column(road.phone, "SELECT APP_NAME FROM APP_DATA WHERE APP_DOWNLOADED = 1"))
 
     wait_until(lambda: downloaded() == set(APPLICATIONS), 30, lambda: f"the table {downloaded()}")
 
@@ -98,7 +88,7 @@ def test_gallery_shows_videos_and_broken_files_and_attaches_in_the_order_of_choo
     road.screen.wait_for("No pictures yet")
     road.back()
     picture, _ = road.add_pictures("morning.png", "banner.jpg")
-    (picture.parent / "clip.mp4").write_bytes(b"\0\0\0\x18ftypmp42")
+    road.put("clip.mp4", b"\0\0\0\x18ftypmp42")
     (picture.parent / "empty.jpg").write_bytes(b"")
     (picture.parent / "cut.jpg").write_bytes((picture.parent / "banner.jpg").read_bytes()[:2000])
     (picture.parent / "notes.txt").write_text("not offered")

@@ -3,6 +3,7 @@
 import pathlib
 import subprocess
 import sys
+import time
 
 import stored_reports as stored
 from phone_driver import ROOT, Phone, wait_until
@@ -15,6 +16,7 @@ ANSWERED = "Charging stops at 80 percent"
 SOLVED = 3
 NOT_SENT = "0"  # Nothing tries again by itself.
 FAILED = "Map is cut off at the right"
+CAPTURED = "The chip covers the title"
 HOUR = 3600
 CRASHED = {"operation": "CRASH_PROCESS", "TAVRO_CRASH_APP_ID": "org.example.mail", "TAVRO_CRASH_APP_NAME": "Mail",
            "TAVRO_CRASH_FOLDER": "mail_17_aa"}
@@ -94,6 +96,76 @@ class Pictures:
         road.screen.activate("Discard")
         road.screen.wait_for("Report a problem")
 
+    def capture(self, road):
+        """A screenshot that is edited, and a video, of a window that shows the landing page."""
+        phone, screen = road.phone, road.screen
+        shown = phone.screenshot(phone.directory / "shown.png")
+        window = subprocess.Popen([phone.program, "exec", "--dir", str(phone.directory), "--", "display", shown],
+                                  stdin=subprocess.DEVNULL)
+        phone.execute("xdotool", "search", "--sync", "--onlyvisible", "--class", "display")
+        phone.launch()
+        road.write_problem("Battery", CAPTURED, "Only after the phone was turned on its side and back.")
+        self.attach_from(road, "Take screenshot")
+        screen.wait_for("Capture")
+        self.take(phone, "capture-screenshot")
+        screen.activate("Capture")
+        screen.wait_for("Selected area")
+        self.edit(road)
+        self.record(road)
+        wait_until(lambda: sum(name.startswith("Remove ") for name in screen.names()) == 2, what="picture and video")
+        self.take(phone, "problem-captured")
+        window.terminate()
+        window.wait()
+        road.send()
+        road.open_history()
+        screen.activate(road.wait_for_row(CAPTURED, "Submitted"))
+        screen.wait_for("Status: Submitted")
+        self.take(phone, "details-video")
+        road.back()
+        road.back()
+
+    def attach_from(self, road, source):
+        time.sleep(0.6)  # a compose screen that has just come up takes no touches yet
+        road.phone.execute("xdotool", "mousemove", "240", "240", "click", "--repeat", "20", "5")  # to the foot
+        road.screen.activate("Attach pictures")
+        road.screen.activate(source)
+
+    def edit(self, road):
+        def drag(tool, name, *places):
+            """Draw with the tool; places in thousandths of the page."""
+            road.screen.activate(tool)
+            page = road.screen.find(name).get_component_iface().get_extents(road.screen.atspi.CoordType.SCREEN)
+            points = [(str(page.x + page.width * x // 1000), str(page.y + page.height * y // 1000)) for x, y in places]
+            road.phone.execute("xdotool", "mousemove", *points[0], "mousedown", "1")
+            for point in points[1:]:
+                road.phone.execute("xdotool", "mousemove", *point)
+            road.phone.execute("xdotool", "mouseup", "1")
+
+        self.take(road.phone, "editor")
+        drag("Hide", "Picture, no hidden area chosen", (545, 420), (600, 450), (800, 530))
+        road.screen.wait_for("Hidden area 1 of 1")
+        drag("Blur", "Picture, no hidden area chosen", (260, 545), (350, 560), (580, 620))
+        road.screen.wait_for("Hidden area 2 of 2")
+        self.take(road.phone, "editor-hidden")
+        road.screen.activate("Done")
+        road.screen.wait_for("Title")
+
+    def record(self, road):
+        screen = road.screen
+        self.attach_from(road, "Record video")
+        screen.wait_for("Record")
+        self.take(road.phone, "capture-video")
+        screen.activate("Record")
+        screen.wait_for("Show the controls")
+        wait_until(lambda: screen.description("Show the controls") <= "00:57", what="three seconds")
+        self.take(road.phone, "capture-recording")
+        screen.activate("Show the controls")
+        screen.activate("Pause")
+        screen.wait_for("Go on")
+        self.take(road.phone, "capture-paused")
+        screen.activate("Stop")
+        screen.wait_gone("Flash_top")
+
     def history(self, road):
         stored.remove_all_reports(road.phone)
         road.open_history()
@@ -167,6 +239,7 @@ class Pictures:
             self.problem(road)
             self.what_is_sent(road)
             self.leaving(road)
+            self.capture(road)
             self.history(road)
             self.deleting(road)
             self.crash(road)

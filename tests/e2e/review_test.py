@@ -3,7 +3,7 @@
 import pytest
 from gi.repository import Gio
 
-from phone_driver import Phone, wait_until
+from phone_driver import wait_until
 from road import Road
 
 PLAYER = "[Desktop Entry]\nType=Application\nName=Player\nMimeType=video/mp4;\nExec=cp %f /opt/usr/played\n"
@@ -13,30 +13,19 @@ PLAYER = "[Desktop Entry]\nType=Application\nName=Player\nMimeType=video/mp4;\nE
 def road(tmp_path_factory):
     data = tmp_path_factory.mktemp("data")
     (data / "applications").mkdir()
-    with Phone(environment={"XDG_DATA_HOME": str(data)}) as phone:
-        phone.start("--accessible")
-        road = Road(phone)
+    with Road.started(environment={"XDG_DATA_HOME": str(data)}) as road:
         road.applications = data / "applications"
-        road.choose_account()
         yield road
-
-
-def put(road, name, content):
-    path = road.phone.storage() / "media/Images" / name
-    path.parent.mkdir(parents=True, exist_ok=True)
-    path.write_bytes(content)
 
 
 def write_problem_with(road, title, **files):
     """A problem with these files, {"clip_mp4": content}."""
     names = [name.replace("_", ".") for name in files]
     for name, content in zip(names, files.values()):
-        put(road, name, content)
+        road.put(name, content)
     road.write_problem("Something else", title, "text")
     road.attach(*names)
-    road.screen.activate("More")
-    road.screen.activate("What is sent")
-    road.screen.wait_for("Your text")
+    road.open_review()
 
 
 def test_what_is_removed_leaves_the_list_and_the_compose_screen(road):

@@ -1,8 +1,9 @@
 """The road of a report, step by step, as a person walks it: shared by the demonstration and the tests."""
 
+import contextlib
 import shutil
 
-from phone_driver import ROOT, Screen, wait_until
+from phone_driver import ROOT, Phone, Screen, wait_until
 from staff_desk import StaffDesk
 
 IN_PROCESS = 2
@@ -14,6 +15,24 @@ class Road:
         self.screen = Screen(phone)
         self.has_seen_what_is_sent = False
         self.desk = StaffDesk(phone.state["desk"], phone.state["desk_token"])
+
+    @classmethod
+    @contextlib.contextmanager
+    def started(cls, *pictures, options=(), environment=None):
+        """On a phone of its own, with an account and these pictures in the gallery."""
+        with Phone(environment=environment) as phone:
+            phone.start("--accessible", *options)
+            road = cls(phone)
+            road.choose_account()
+            road.add_pictures(*pictures)
+            yield road
+
+    def put(self, name, content):
+        """A file of the gallery."""
+        path = self.phone.storage() / "media/Images" / name
+        path.parent.mkdir(parents=True, exist_ok=True)
+        path.write_bytes(content)
+        return path
 
     def add_pictures(self, *names):
         """Put pictures into the phone's gallery; returns their paths on this machine."""
@@ -59,6 +78,11 @@ class Road:
         for name in names:
             self.screen.wait_for("Remove " + name)
 
+    def open_review(self):
+        self.screen.activate("More")
+        self.screen.activate("What is sent")
+        self.screen.wait_for("Your text")
+
     def send(self):
         self.screen.activate("Send")
         if not self.has_seen_what_is_sent:
@@ -78,6 +102,19 @@ class Road:
         def rows():
             return [name for name in self.screen.names() if all(text in name for text in texts)]
         return wait_until(rows, timeout, lambda: f"{texts} in {self.screen.names()}")[0]
+
+    def kept_files(self):
+        """What the client keeps of an unfinished report; what ends in .new is on its way there."""
+        return sorted(path for path in self.phone.data().glob(".tavro.compose*") if path.suffix != ".new")
+
+    def wait_until_kept(self, text):
+        wait_until(lambda: any(text in path.read_text() for path in self.kept_files()), what=f"'{text}' being kept")
+
+    def relaunch(self):
+        """End the client, whatever it was doing, and bring it back to its landing page."""
+        self.phone.end()
+        self.phone.launch()
+        self.screen.wait_for("Report a problem")
 
     def back(self):
         self.screen.activate("Back")

@@ -1,12 +1,10 @@
 """The road of a report on a real phone: what a person sees when all goes well, and what is left when parts of it
 are killed or away."""
 
-import contextlib
 import os
 import random
 import signal
 import socket
-import sqlite3
 import subprocess
 import sys
 import threading
@@ -14,6 +12,7 @@ import time
 
 import pytest
 
+import stored_reports
 from phone_driver import BUILD, ROOT, Phone, wait_until
 from road import Road
 
@@ -58,22 +57,6 @@ def road(desk):
         road.choose_account()
         road.add_pictures("morning.png", "banner.jpg")
         yield road
-
-
-def relaunch(road):
-    """Bring the client back to its landing page, whatever it was doing."""
-    client = road.phone.status().get("corvane.tavro-lite")
-    if client:
-        road.phone.execute("kill", "-9", str(client), check=False)  # it may have ended by itself
-        wait_until(lambda: road.phone.status().get("corvane.tavro-lite") != client, 10, "the client being gone")
-    road.phone.launch()
-    road.screen.wait_for("Report a problem")
-
-
-def titles_stored(phone):
-    path = phone.directory / "usr/apps/corvane.tavro-lite/shared/data/.tavro.db"
-    with contextlib.closing(sqlite3.connect(path, timeout=5)) as store:
-        return [title for title, in store.execute("SELECT VOC_TITLE_TEXT FROM TABLE_VOC_EXTENDED")]
 
 
 def titles_at(desk_page):
@@ -192,11 +175,11 @@ def test_nothing_is_lost_when_a_part_is_killed_while_sending(road, desk, victim)
             desk.process.wait()
             desk.start()
         if victim == "corvane.tavro-lite":
-            relaunch(road)
+            road.relaunch()
         else:
             road.screen.wait_for("Report a problem")
         sent.append(title)
-    stored = [title for title in sent if title in titles_stored(road.phone)]
+    stored = [title for title in sent if title in stored_reports.titles(road.phone)]
     # A client that was killed before it began to store had nothing to lose but its own screen.
     assert victim == "corvane.tavro-lite" or stored == sent
     for title in stored:

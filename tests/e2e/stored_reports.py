@@ -9,8 +9,17 @@ PROBLEM, IDEA = "TAVRO_DBMGR_BUG_REPORT", "TAVRO_DBMGR_SUGGESTION"
 
 
 def connect(phone):
-    path = phone.storage() / "apps/corvane.tavro-lite/shared/data/.tavro.db"
-    return contextlib.closing(sqlite3.connect(path, timeout=10))
+    return contextlib.closing(sqlite3.connect(phone.data() / ".tavro.db", timeout=10))
+
+
+def column(phone, statement):
+    """What a query of one column finds."""
+    with connect(phone) as store:
+        return [value for value, in store.execute(statement)]
+
+
+def titles(phone):
+    return column(phone, "SELECT VOC_TITLE_TEXT FROM TABLE_VOC_EXTENDED")
 
 
 def add_report(phone, title, status=SUBMITTED, target="Hardware", text="", kind=PROBLEM, age=0, reply=None, dump=None):

@@ -7,7 +7,7 @@ import zipfile
 
 import pytest
 
-from phone_driver import Phone, wait_until
+from phone_driver import wait_until
 from road import Road
 
 CRASH_SERVICE = "org.tizen.system.crash"
@@ -31,10 +31,7 @@ def make_journal(machine, words):
 @pytest.fixture(scope="module")
 def road(machine):
     make_journal(machine, "echo a line of the journal")
-    with Phone(environment={"PATH": f"{machine}:{os.environ['PATH']}"}) as phone:
-        phone.start("--accessible")
-        road = Road(phone)
-        road.choose_account()
+    with Road.started(environment={"PATH": f"{machine}:{os.environ['PATH']}"}) as road:
         yield road
 
 

@@ -13,9 +13,9 @@
 #include <cstdlib>
 #include <cstring>
 #include <string>
-#include <string_view>
 
 #include "dbmgr/tavro_dbmgr_text_match.h"
+#include "fuzz_input.h"
 #include "tavro_dbmgr.h"
 #include "tavro_details_text.h"
 #include "tavro_handles.h"
@@ -24,37 +24,10 @@
 
 namespace {
 
-using voc_owner = TavroHandle<svc_voc_data, tavro_dbmgr_free_voc_data>;
 using text_owner = TavroHandle<char, std::free>;
 
 constexpr std::size_t kLongestTime = sizeof "23/12/9999";
 constexpr std::size_t kLongestTimeline = 20;
-
-void expect(bool is_so, const char *what) {
-  if (is_so) return;
-  std::fprintf(stderr, "history_fuzz: %s\n", what);
-  std::abort();
-}
-
-class texts {
- public:
-  texts(const std::uint8_t *data, std::size_t size) : rest_(reinterpret_cast<const char *>(data), size) {}
-  // The next text, tracked; null when there is none.
-  char *next() {
-    if (rest_.empty()) return nullptr;
-    const std::size_t end = std::min(rest_.find('\0'), rest_.size());
-    const std::string text(rest_.substr(0, end));
-    rest_.remove_prefix(std::min(end + 1, rest_.size()));
-    return TAVRO_STRDUP(text.c_str());
-  }
-
- private:
-  std::string_view rest_;
-};
-
-std::size_t separators(const char *history) {
-  return history ? static_cast<std::size_t>(std::count(history, history + std::strlen(history), '#')) : 0;
-}
 
 bool is_text(const char *text) {
   return text && g_utf8_validate(text, -1, nullptr);
@@ -159,13 +132,13 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size
     const voc_owner voc(TAVRO_ZALLOC(svc_voc_data));
     for (char **member : {&voc->submitted, &voc->push_comments, &voc->date_of_updation,
                           &voc->date_of_creation, &voc->title_description, &voc->description, &voc->app_name})
-      *member = input.next();
-    const TavroText wanted(input.next());
+      *member = input.next_copy();
+    const TavroText wanted(input.next_copy());
     expect_statuses(voc->submitted);
     expect_row(*voc);
     expect_details(*voc);
     expect_found(voc->description, wanted.get(), voc->push_comments);
   }
-  for (const tavro_meminfo_s &slot : gMemDb) expect(!slot.slotfree, "a block is still held");
+  expect_nothing_held();
   return 0;
 }

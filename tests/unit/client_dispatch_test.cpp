@@ -7,6 +7,7 @@
 #include <fstream>
 
 #include "client_support.h"
+#include "store_access.h"
 #include "tavro_appcontrol_util.h"
 #include "tavro_appdata.h"
 #include "tavro_dbmgr.h"
@@ -31,6 +32,21 @@ class Dispatch : public ClientTest {
     tavro_dbmgr_update_server_voc_id(id, 77);
     _tavro_dbmgr_update_push_status_comments("77", "2", "we look at it");
     return id;
+  }
+  void update(Extras extras) { launch("TAVRO_UPDATE_HISTORY", extras); }
+  void upload(const std::string &result, const std::string &id) {
+    update({{TAVRO_SERVER_UPLOAD_STATUS, result}, {TAVRO_SERVER_PUSH_NOTI_VOC_ID, id}});
+  }
+  void reply(int id, const char *text) {
+    update({{TAVRO_SERVER_PUSH_NOTI_STATUS, TAVRO_SERVER_PUSH_NOTI_UPDATED},
+            {TAVRO_SERVER_PUSH_NOTI_VOC_ID, std::to_string(id)},
+            {TAVRO_SERVER_PUSH_NOTI_VOC_COMMENTS, text}});
+  }
+  // Its start is no part of the test.
+  void open_client() {
+    launch(nullptr);
+    Listener::get().take();
+    ui_calls.clear();
   }
 };
 
@@ -157,11 +173,8 @@ TEST_F(Dispatch, AnUploadedReportGivesUpItsLogAndIsAnnounced) {
   const std::string log_path = std::string(getenv("TMPDIR")) + "/system.log";
   std::ofstream(log_path) << "log";
   const std::string id = std::to_string(store_report("no sound", 12, log_path.c_str()));
-  launch(nullptr);
-  Listener::get().take();
-  ui_calls.clear();
-  launch("TAVRO_UPDATE_HISTORY",
-         {{TAVRO_SERVER_UPLOAD_STATUS, TAVRO_SERVER_UPLOAD_SUCCESS}, {TAVRO_SERVER_PUSH_NOTI_VOC_ID, id}});
+  open_client();
+  upload(TAVRO_SERVER_UPLOAD_SUCCESS, id);
   EXPECT_FALSE(std::filesystem::exists(log_path));
   EXPECT_THAT(Listener::get().take_answers(), ElementsAre("Notify IDS_OB_MBODY_FEEDBACK_SENT|no sound"));
   EXPECT_THAT(ui_calls, ElementsAre("update history", "update details " + id));
@@ -171,8 +184,7 @@ TEST_F(Dispatch, AnUploadedReportGivesUpItsLogAndIsAnnounced) {
 TEST_F(Dispatch, AnUploadResultIsShownOnlyToItsOwnerWhoIsSignedIn) {
   const std::string id = std::to_string(store_report("no sound", 11));
   const auto fail = [&] {
-    launch("TAVRO_UPDATE_HISTORY",
-           {{TAVRO_SERVER_UPLOAD_STATUS, TAVRO_SERVER_UPLOAD_FAIL}, {TAVRO_SERVER_PUSH_NOTI_VOC_ID, id}});
+    upload(TAVRO_SERVER_UPLOAD_FAIL, id);
     return Listener::get().take_answers();
   };
   EXPECT_THAT(fail(), IsEmpty());
@@ -186,22 +198,15 @@ TEST_F(Dispatch, AnUploadResultIsShownOnlyToItsOwnerWhoIsSignedIn) {
 
 TEST_F(Dispatch, AReplyRaisesBadgeAndNotificationAndRefreshesWhatIsOpen) {
   const int id = answered_report();
-  launch(nullptr);
-  Listener::get().take();
-  ui_calls.clear();
-  const auto reply = [&] {
-    launch("TAVRO_UPDATE_HISTORY", {{TAVRO_SERVER_PUSH_NOTI_STATUS, TAVRO_SERVER_PUSH_NOTI_UPDATED},
-                                    {TAVRO_SERVER_PUSH_NOTI_VOC_ID, std::to_string(id)},
-                                    {TAVRO_SERVER_PUSH_NOTI_VOC_COMMENTS, "we look at it"}});
-  };
-  reply();
+  open_client();
+  reply(id, "we look at it");
   unsigned int count = 0;
   EXPECT_EQ(badge_get_count(TAVRO_APP_ID, &count), BADGE_ERROR_NONE);
   EXPECT_EQ(count, 1u);
   EXPECT_THAT(ui_calls, ElementsAre("badge 1", "update history", "update details " + std::to_string(id)));
   EXPECT_THAT(Listener::get().take_answers(), ElementsAre("Notify IDS_OB_MBODY_NEW_REPLY|we look at it"));
   preference_set_string("tavro_username", "bert");
-  reply();
+  reply(id, "we look at it");
   EXPECT_THAT(Listener::get().take_answers(), IsEmpty()) << "it is anna's";
 }
 
@@ -210,10 +215,7 @@ TEST_F(Dispatch, TwoAnswersInTheSameMillisecondAreBothStoredAndTold) {
   _tavro_dbmgr_update_push_status_comments("77", "3", "solved");
   _tavro_dbmgr_update_push_status_comments("424242", "3", "nobody's");
   launch(nullptr);
-  for (const char *reply : {"we look at it", "solved"})
-    launch("TAVRO_UPDATE_HISTORY", {{TAVRO_SERVER_PUSH_NOTI_STATUS, TAVRO_SERVER_PUSH_NOTI_UPDATED},
-                                    {TAVRO_SERVER_PUSH_NOTI_VOC_ID, std::to_string(id)},
-                                    {TAVRO_SERVER_PUSH_NOTI_VOC_COMMENTS, reply}});
+  for (const char *text : {"we look at it", "solved"}) reply(id, text);
   EXPECT_THAT(Listener::get().take_answers(),
               ::testing::IsSupersetOf(
                   {"Notify IDS_OB_MBODY_NEW_REPLY|we look at it", "Notify IDS_OB_MBODY_NEW_REPLY|solved"}));
@@ -224,11 +226,6 @@ TEST_F(Dispatch, TwoAnswersInTheSameMillisecondAreBothStoredAndTold) {
 }
 
 TEST_F(Dispatch, AReplyIsToldAndTheClientEndsAlsoWhenTheStoreCannotBeCounted) {
-  const auto run = [](const char *sql) {
-    TavroDb db;
-    sqlite3_open(TAVRO_DBMGR_FILE, tavro_out(db));
-    EXPECT_EQ(sqlite3_exec(db.get(), sql, nullptr, nullptr, nullptr), SQLITE_OK);
-  };
   sign_in();
   const TavroRequest reply = make_request(nullptr, {{TAVRO_SERVER_PUSH_NOTI_VOC_COMMENTS, "we look at it"}});
   run("ALTER TABLE TABLE_VOC RENAME TO AWAY");
@@ -251,7 +248,7 @@ TEST_F(Dispatch, AClientStartedForAMessageEndsAndBuildsNoWindow) {
        {std::pair(TAVRO_SERVER_UPLOAD_STATUS, TAVRO_SERVER_UPLOAD_SUCCESS),
         std::pair(TAVRO_SERVER_PUSH_NOTI_STATUS, TAVRO_SERVER_PUSH_NOTI_UPDATED)}) {
     tavro_initialize_application_data(&ad);
-    launch("TAVRO_UPDATE_HISTORY", {{key, value}, {TAVRO_SERVER_PUSH_NOTI_VOC_ID, id}});
+    update({{key, value}, {TAVRO_SERVER_PUSH_NOTI_VOC_ID, id}});
     EXPECT_TRUE(tavro_is_ending());
     EXPECT_EQ(ad.win, nullptr);
   }
@@ -259,13 +256,11 @@ TEST_F(Dispatch, AClientStartedForAMessageEndsAndBuildsNoWindow) {
 
 TEST_F(Dispatch, AMandatoryUpdateStopsTheRestOfTheMessage) {
   const int id = answered_report();
-  preference_set_string(TAVRO_PREF_APP_RESULT_CODE, "2");
-  preference_set_string(TAVRO_PREF_APP_VERSION_CHANGE, "major");
-  preference_set_string(TAVRO_PREF_APP_VERSION, "9.9");
-  launch("TAVRO_UPDATE_HISTORY", {{TAVRO_APP_UPDATE_STATUS, "any"},
-                                  {TAVRO_SERVER_UPLOAD_STATUS, TAVRO_SERVER_UPLOAD_SUCCESS},
-                                  {TAVRO_SERVER_PUSH_NOTI_STATUS, TAVRO_SERVER_PUSH_NOTI_UPDATED},
-                                  {TAVRO_SERVER_PUSH_NOTI_VOC_ID, std::to_string(id)}});
+  offer_version("major");
+  update({{TAVRO_APP_UPDATE_STATUS, "any"},
+          {TAVRO_SERVER_UPLOAD_STATUS, TAVRO_SERVER_UPLOAD_SUCCESS},
+          {TAVRO_SERVER_PUSH_NOTI_STATUS, TAVRO_SERVER_PUSH_NOTI_UPDATED},
+          {TAVRO_SERVER_PUSH_NOTI_VOC_ID, std::to_string(id)}});
   EXPECT_THAT(ui_calls, ElementsAre("window", "landing", "popup IDS_OB_HEADER_UPDATE_AVAILABLE"));
   EXPECT_THAT(Listener::get().take_answers(), IsEmpty());
   EXPECT_EQ(ad.push_noti_count, 0);
@@ -273,13 +268,10 @@ TEST_F(Dispatch, AMandatoryUpdateStopsTheRestOfTheMessage) {
 
 TEST_F(Dispatch, AnUpdateThatCouldNotBeOfferedYetIsOfferedOverAPageOrAtTheNextStart) {
   const std::string id = std::to_string(answered_report());
-  preference_set_string(TAVRO_PREF_APP_RESULT_CODE, "2");
-  preference_set_string(TAVRO_PREF_APP_VERSION_CHANGE, "minor");
-  preference_set_string(TAVRO_PREF_APP_VERSION, "9.9");
+  offer_version("minor");
   preference_set_string(TAVRO_PREF_APP_UPDATE_TIME, (std::to_string(std::time(nullptr)) + "000").c_str());
   app_create(&ad);
-  launch("TAVRO_UPDATE_HISTORY",
-         {{TAVRO_SERVER_UPLOAD_STATUS, TAVRO_SERVER_UPLOAD_SUCCESS}, {TAVRO_SERVER_PUSH_NOTI_VOC_ID, id}});
+  upload(TAVRO_SERVER_UPLOAD_SUCCESS, id);
   EXPECT_TRUE(tavro_is_ending());
   app_terminate(&ad);
   ui_calls.clear();
@@ -292,16 +284,14 @@ TEST_F(Dispatch, AnUpdateThatCouldNotBeOfferedYetIsOfferedOverAPageOrAtTheNextSt
 TEST_F(Dispatch, ValuesThatMakeNoSenseChangeNothingStored) {
   const int id = answered_report();
   const std::string before = column(id, "VOC_STATE || VOC_PUSH_COMMENTS || VOC_PUSH_READ");
-  launch(nullptr);
-  Listener::get().take();
+  open_client();
   const std::string huge(1 << 20, 'x');
   for (const std::string &bad : {huge, std::string("12x"), std::string("-5"), std::string("424242")}) {
-    launch("TAVRO_UPDATE_HISTORY", {{TAVRO_SERVER_UPLOAD_STATUS, bad}, {TAVRO_SERVER_PUSH_NOTI_VOC_ID, bad}});
-    launch("TAVRO_UPDATE_HISTORY",
-           {{TAVRO_SERVER_UPLOAD_STATUS, TAVRO_SERVER_UPLOAD_FAIL}, {TAVRO_SERVER_PUSH_NOTI_VOC_ID, bad}});
+    upload(bad, bad);
+    upload(TAVRO_SERVER_UPLOAD_FAIL, bad);
     EXPECT_THAT(Listener::get().take_answers(), ElementsAre("Notify IDS_OB_TMBODY_SENDING_FAILED|"));
   }
-  launch("TAVRO_UPDATE_HISTORY", {{huge.c_str(), huge}});
+  update({{huge.c_str(), huge}});
   // A key that came twice is no text.
   const TavroRequest twice = make_request("TAVRO_UPDATE_HISTORY", {});
   const char *ids[] = {"1", "2"}, *statuses[] = {TAVRO_SERVER_UPLOAD_FAIL, TAVRO_SERVER_UPLOAD_FAIL};

@@ -5,9 +5,10 @@
 
 #include <filesystem>
 #include <fstream>
-#include <sstream>
 
 #include "client_support.h"
+#include "files.h"
+#include "store_access.h"
 #include "tavro_autosave.h"
 #include "tavro_dbmgr.h"
 #include "tavro_drafts.h"
@@ -60,11 +61,6 @@ class Drafts : public ClientTest {
     __tavro_app_battery_capacity_changed_cb(DEVICE_CALLBACK_BATTERY_CAPACITY,
                                             reinterpret_cast<void *>(static_cast<intptr_t>(percent)), &ad);
   }
-  static void run(const std::string &sql) {
-    TavroDb db;
-    sqlite3_open(TAVRO_DBMGR_FILE, tavro_out(db));
-    EXPECT_EQ(sqlite3_exec(db.get(), sql.c_str(), nullptr, nullptr, nullptr), SQLITE_OK) << sql;
-  }
   // These statements fail until unblock_store, as on a full disk.
   static void block_store(const std::string &what) {
     run("CREATE TRIGGER \"" + what + "\" BEFORE " + what + " BEGIN SELECT RAISE(FAIL, 'full'); END");
@@ -89,9 +85,7 @@ TEST_F(Drafts, ASentProblemIsStoredWholeAndHandedOverAfterItsNotification) {
   const std::string status_file = column(id, "REF_3");
   EXPECT_THAT(status_file,
               ::testing::MatchesRegex("/opt/usr/media/VantorCommunity/VantorCommunity_20[0-9]{12}\\.txt"));
-  std::stringstream lines;
-  lines << std::ifstream(status_file).rdbuf();
-  EXPECT_THAT(lines.str(),
+  EXPECT_THAT(file_contents(status_file),
               ::testing::MatchesRegex(
                   "System Info - Build Version : .*, Screen width : [0-9]+, Screen height : [0-9]+\n"
                   "Battery Info - Percent : [0-9]+, Battery Level : [0-9], (Not )?Charging\n"
@@ -123,15 +117,13 @@ TEST_F(Drafts, AReopenedDraftWhoseLogWasTakenOffLosesThatFile) {
   const std::string log_path = std::string(getenv("TMPDIR")) + "/draft.log";
   std::ofstream(log_path) << "log";
   ad.id_to_delete = store_report("older", 6, log_path.c_str());
-  open_problem();
-  ad.problem_view->collectBtn = elm_button_add(win_);
-  tavro_save_problem_compose_data(&ad, TAVRO_STATUS_DRAFT_SAVED);
-  EXPECT_TRUE(std::filesystem::exists(log_path));
-  open_problem();
-  ad.problem_view->collectBtn = elm_button_add(win_);
-  evas_object_show(ad.problem_view->collectBtn);
-  tavro_save_problem_compose_data(&ad, TAVRO_STATUS_DRAFT_SAVED);
-  EXPECT_FALSE(std::filesystem::exists(log_path));
+  for (const bool is_taken_off : {false, true}) {
+    open_problem();
+    ad.problem_view->collectBtn = elm_button_add(win_);
+    if (is_taken_off) evas_object_show(ad.problem_view->collectBtn);
+    tavro_save_problem_compose_data(&ad, TAVRO_STATUS_DRAFT_SAVED);
+    EXPECT_EQ(std::filesystem::exists(log_path), !is_taken_off);
+  }
 }
 
 TEST_F(Drafts, SendingLeavesOneRecordInPlaceOfDraftAndAutomaticCopy) {

@@ -2,10 +2,9 @@
 #include <gmock/gmock.h>
 
 #include <ctime>
-#include <fstream>
-#include <sstream>
 
 #include "client_support.h"
+#include "files.h"
 #include "tavro_lifecycle.h"
 #include "tavro_memory.h"
 #include "tavro_preferences.h"
@@ -44,9 +43,7 @@ TEST_F(Lifecycle, TheFirstStartSeedsPreferencesAndLaterOnesKeepThem) {
 
 TEST_F(Lifecycle, AMandatoryUpdateLeavesEverythingElseUndone) {
   sign_in();
-  preference_set_string(TAVRO_PREF_APP_RESULT_CODE, "2");
-  preference_set_string(TAVRO_PREF_APP_VERSION_CHANGE, "major");
-  preference_set_string(TAVRO_PREF_APP_VERSION, "9.9");
+  offer_version("major");
   EXPECT_TRUE(app_create(&ad));
   EXPECT_FALSE(flag(TAVRO_PREF_NOTIFY));
   EXPECT_EQ(tavro_preference_int(TAVRO_PREF_MAX_SIZE_ATTACHMENT, 0), 0);
@@ -88,9 +85,7 @@ TEST_F(Lifecycle, TerminateDropsARunningRecordingAndReleasesTheRecord) {
   EXPECT_EQ(ad.add_video_to_tavro, 0);
   EXPECT_FALSE(tavro_preference_flag(TAVRO_PREF_SYSLOGS, true));
   EXPECT_EQ(ad.win, nullptr);
-  std::stringstream log;
-  log << std::ifstream("/opt/usr/share/log/platform.log").rdbuf();
-  const std::string text = log.str();
+  const std::string text = file_contents("/opt/usr/share/log/platform.log");
   EXPECT_THAT(text.substr(text.rfind("app terminate")), HasSubstr("total leak = 0"));
 }
 

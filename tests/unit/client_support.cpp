@@ -9,6 +9,8 @@
 #include <stdexcept>
 #include <thread>
 
+#include "bus_connection.h"
+#include "store_access.h"
 #include "tavro-common.h"
 #include "tavro_appcontrol_util.h"
 #include "tavro_appdata.h"
@@ -17,6 +19,7 @@
 #include "tavro_dbmgr.h"
 #include "tavro_memory.h"
 #include "tavro_notifications.h"
+#include "tavro_preferences.h"
 #include "tavro_save_journal.h"
 #include "tavro_screens.h"
 #include "tavro_service_bridge.h"
@@ -79,30 +82,15 @@ Listener &Listener::get() {
 }
 
 Listener::Listener() {
-  bus_.reset(g_dbus_connection_new_for_address_sync(
-      getenv("DBUS_SESSION_BUS_ADDRESS"),
-      static_cast<GDBusConnectionFlags>(G_DBUS_CONNECTION_FLAGS_AUTHENTICATION_CLIENT |
-                                        G_DBUS_CONNECTION_FLAGS_MESSAGE_BUS_CONNECTION),
-      nullptr, nullptr, nullptr));
+  bus_.reset(connect_to_bus());
   g_dbus_connection_add_filter(bus_.get(), filter, this, nullptr);
   for (const char *name : {"corvane.tavro-svc", "org.tizen.tizenstore", "org.tizen.system.crash",
-                           "org.freedesktop.Notifications"}) {
-    ask_bus("RequestName", g_variant_new("(su)", name, 4u));
-  }
-}
-
-void Listener::ask_bus(const char *method, GVariant *arguments) {
-  g_variant_unref(g_dbus_connection_call_sync(bus_.get(), "org.freedesktop.DBus", "/org/freedesktop/DBus",
-                                              "org.freedesktop.DBus", method, arguments, nullptr,
-                                              G_DBUS_CALL_FLAGS_NONE, -1, nullptr, nullptr));
+                           "org.freedesktop.Notifications"})
+    set_name_owned(bus_.get(), name, true);
 }
 
 void Listener::set_crash_service(bool is_present) {
-  const char *name = "org.tizen.system.crash";
-  if (is_present)
-    ask_bus("RequestName", g_variant_new("(su)", name, 4u));
-  else
-    ask_bus("ReleaseName", g_variant_new("(s)", name));
+  set_name_owned(bus_.get(), "org.tizen.system.crash", is_present);
 }
 
 GDBusMessage *Listener::filter(GDBusConnection *bus, GDBusMessage *message, gboolean is_incoming,
@@ -217,14 +205,14 @@ void ClientTest::launch(const char *operation, Extras extras) {
   app_control(make_request(operation, extras).get(), &ad);
 }
 
+void ClientTest::offer_version(const char *change) {
+  preference_set_string(TAVRO_PREF_APP_RESULT_CODE, "2");
+  preference_set_string(TAVRO_PREF_APP_VERSION_CHANGE, change);
+  preference_set_string(TAVRO_PREF_APP_VERSION, "9.9");
+}
+
 std::string ClientTest::query(const std::string &sql) {
-  TavroDb db;
-  TavroStmt statement;
-  sqlite3_open(TAVRO_DBMGR_FILE, tavro_out(db));
-  sqlite3_prepare_v2(db.get(), ("SELECT " + sql).c_str(), -1, tavro_out(statement), nullptr);
-  if (sqlite3_step(statement.get()) != SQLITE_ROW) return "no row";
-  const auto *text = reinterpret_cast<const char *>(sqlite3_column_text(statement.get(), 0));
-  return text ? text : "NULL";
+  return value("SELECT " + sql, "NULL", "no row");
 }
 
 std::string ClientTest::column(int voc_id, const char *name) {

@@ -37,7 +37,6 @@ class Listener {
   static GDBusMessage *filter(GDBusConnection *bus, GDBusMessage *message, gboolean is_incoming,
                               gpointer self);
   void note(GDBusMessage *message);
-  void ask_bus(const char *method, GVariant *arguments);
   bool holds(const std::string &text);
 
   TavroObject<GDBusConnection> bus_;
@@ -56,6 +55,8 @@ class ClientTest : public ::testing::Test {
   // Hand a launch request to the client as the platform does.
   void launch(const char *operation, Extras extras = {});
   void sign_in() { preference_set_string("tavro_username", "anna"); }
+  // The service has heard of version 9.9; `change` is "major" or "minor".
+  void offer_version(const char *change);
   // First value of a SELECT on the store, and of a column of one report.
   static std::string query(const std::string &sql);
   static std::string column(int voc_id, const char *name);

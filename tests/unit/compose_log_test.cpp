@@ -1,6 +1,7 @@
 // The system log of a report on the compose screen.
 #include <gmock/gmock.h>
 
+#include "bus_connection.h"
 #include "compose_world.h"
 #include "tavro_autosave.h"
 #include "tavro_compose_parts.h"
@@ -20,15 +21,8 @@ class ComposeLog : public Compose {
 
   // A crash service that takes its time: the test answers for it.
   static void start_service() {
-    static TavroObject<GDBusConnection> bus(g_dbus_connection_new_for_address_sync(
-        getenv("DBUS_SYSTEM_BUS_ADDRESS"),
-        GDBusConnectionFlags(G_DBUS_CONNECTION_FLAGS_AUTHENTICATION_CLIENT |
-                             G_DBUS_CONNECTION_FLAGS_MESSAGE_BUS_CONNECTION),
-        nullptr, nullptr, nullptr));
-    const TavroVariant reply(
-        g_dbus_connection_call_sync(bus.get(), "org.freedesktop.DBus", "/", "org.freedesktop.DBus",
-                                    "RequestName", g_variant_new("(su)", TAVRO_CRASH_SERVICE, 0u), nullptr,
-                                    G_DBUS_CALL_FLAGS_NONE, -1, nullptr, nullptr));
+    static TavroObject<GDBusConnection> bus(connect_to_bus());
+    set_name_owned(bus.get(), TAVRO_CRASH_SERVICE, true);
   }
   std::string service_answers(const char *name) {
     const std::string path = std::string(TAVRO_LOG_DUMP_FOLDER) + name;

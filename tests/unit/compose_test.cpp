@@ -7,6 +7,8 @@
 #include "tavro_autosave.h"
 #include "tavro_compose_parts.h"
 #include "tavro_compose_strip.h"
+#include "tavro_deleted_files.h"
+#include "tavro_hoverui.h"
 
 namespace {
 
@@ -32,6 +34,9 @@ TEST_F(Compose, NamesEachFileThatItRefusesWithTheReason) {
   std::string paths[] = {make_picture("good.jpg"),
                          make_file("empty.jpg", ""),
                          make_file("text.jpg", "no picture at all"),
+                         make_file("boxed.mp4", std::string("\0\0\0\x18"
+                                                            "ftypisom\0\0\0\0mp42avif",
+                                                            24)),
                          make_picture("huge.jpg", off_t{4} << 30),
                          std::string(kComposeMedia) + "gone.jpg",
                          kComposeMedia};
@@ -41,9 +46,84 @@ TEST_F(Compose, NamesEachFileThatItRefusesWithTheReason) {
   g_slist_free(list);
   EXPECT_THAT(attached(), ElementsAre("good.jpg"));
   const std::string told = body(ad_.cancel_popup);
-  for (const char *part : {"empty.jpg: the file is empty", "text.jpg: not a picture",
-                           "huge.jpg: larger than the limit of 30.0 MB", "gone.jpg: cannot be read"})
+  for (const char *part :
+       {"empty.jpg: the file is empty", "text.jpg: not a picture", "boxed.mp4: not a picture",
+        "huge.jpg: larger than the limit of 30.0 MB", "gone.jpg: cannot be read"})
     EXPECT_THAT(told, HasSubstr(part));
+}
+
+constexpr char kOwnFolder[] = "/opt/usr/media/VantorCommunity/";
+const auto kIsCopy = testing::MatchesRegex("/opt/usr/media/VantorCommunity/VantorCommunity_.*jpg");
+
+std::string make_webp() {
+  return make_file(
+      "modern.webp",
+      std::string("RIFF\x1a\0\0\0WEBPVP8L\x0d\0\0\0\x2f\0\0\0\x10\x07\x10\x11\x11\x88\x88\xfe\x07\0", 34));
+}
+
+TEST_F(Compose, WebpPictureBecomesACopyThatSupportCanOpenUnlessTheScreenEndsMeanwhile) {
+  std::string path = make_webp();
+  const TavroHandle<GSList, g_slist_free> list(g_slist_append(nullptr, path.data()));
+  tavro_create_problem_page(&ad_, nullptr);
+  tavro_compose_attach(view(), make_picture("before.jpg").c_str());
+  tavro_compose_attach_files(&ad_, list.get());
+  tavro_compose_attach(view(), make_picture("after.jpg").c_str());
+  EXPECT_THAT(attached(), ElementsAre("before.jpg", "modern.webp", "after.jpg"));
+  ASSERT_TRUE(wait_for([this] { return attached()[1] != "modern.webp"; }));
+  EXPECT_THAT(tavro_compose_attached(&ad_)[1], kIsCopy);
+  tavro_compose_attach_files(&ad_, list.get());
+  end();
+  start();
+  tavro_create_problem_page(&ad_, nullptr);
+  settle();
+  EXPECT_THAT(attached(), testing::IsEmpty());
+  EXPECT_EQ(std::distance(std::filesystem::directory_iterator(kOwnFolder), {}), 1);
+}
+
+TEST_F(Compose, SendWaitsForAPictureThatIsBeingConvertedAndADraftHoldsThePictureItself) {
+  std::string path = make_webp();
+  const TavroHandle<GSList, g_slist_free> list(g_slist_append(nullptr, path.data()));
+  write_problem();
+  tavro_compose_attach_files(&ad_, list.get());
+  const int id = tavro_save_compose_draft(&ad_);
+  const std::string stored = "SELECT ATTACHMENT_FILE_PATH FROM ATTACHMENT ORDER BY rowid DESC LIMIT 1";
+  EXPECT_EQ(value(stored), path);
+  settle();
+  const Voc draft(tavro_dbmgr_get_voc_by_id(id));
+  tavro_create_problem_page(&ad_, draft.get());
+  ASSERT_TRUE(wait_for([this] { return attached()[0] != "modern.webp"; }));
+  settle();
+
+  tavro_compose_attach_files(&ad_, list.get());
+  tap_send();
+  ASSERT_TRUE(answer(ad_.cancel_popup, "IDS_OB_BUTTON_STAY"));
+  ASSERT_TRUE(wait_for([this] { return attached()[1] != "modern.webp"; }));
+  tavro_compose_attach_files(&ad_, list.get());
+  const int before = reports();
+  tavro_compose_send_from_review(&ad_);
+  EXPECT_TRUE(view());
+  ASSERT_TRUE(wait_for([this] { return !view(); }));
+  EXPECT_EQ(reports(), before) << "in the place of the draft";
+  EXPECT_THAT(value(stored), kIsCopy);
+}
+
+TEST_F(Compose, VideoThatTheClientMadeGoesWhenItIsTakenOffAndOneOfTheGalleryStays) {
+  tavro_create_problem_page(&ad_, nullptr);
+  const std::string gallery = make_file("a.mp4", std::string("\0\0\0\x08"
+                                                             "ftypmp42",
+                                                             12));
+  const std::string own = std::string(kOwnFolder) + "a.mp4", tile = std::string(kOwnFolder) + ".a.mp4.jpg";
+  std::filesystem::create_directories(kOwnFolder);
+  std::filesystem::copy_file(gallery, own);
+  std::ofstream(tile) << "its picture";
+  for (const char *unfinished : {own.c_str(), ""}) tavro_deleted_files_set_unfinished(unfinished);
+  for (const std::string &path : {gallery, own}) {
+    ASSERT_TRUE(tavro_compose_attach(view(), path.c_str()));
+    tavro_compose_strip_remove(&ad_, path.c_str());
+  }
+  settle();
+  EXPECT_TRUE(std::filesystem::exists(gallery));
+  EXPECT_FALSE(std::filesystem::exists(own) || std::filesystem::exists(tile));
 }
 
 TEST_F(Compose, AttachmentsAreReorderedAndTheMenuOffersOnlyWhatIsPossible) {
@@ -134,9 +214,9 @@ TEST_F(Compose, StoreThatRefusesTheReportLeavesTheScreenAsItIs) {
   write_problem();
   const std::string picture = make_picture("kept.jpg");
   tavro_compose_attach(view(), picture.c_str());
-  query("CREATE TRIGGER full BEFORE INSERT ON TABLE_VOC BEGIN SELECT RAISE(FAIL, 'full'); END");
+  run("CREATE TRIGGER full BEFORE INSERT ON TABLE_VOC BEGIN SELECT RAISE(FAIL, 'full'); END");
   tap_send();
-  query("DROP TRIGGER full");
+  run("DROP TRIGGER full");
   ASSERT_TRUE(view());
   EXPECT_STREQ(elm_entry_entry_get(view()->title_entry), "It broke");
   EXPECT_THAT(attached(), ElementsAre("kept.jpg"));
@@ -194,7 +274,7 @@ TEST_F(Compose, UnchangedDraftStaysAndItsAutomaticCopyGoesWhenThePageOrTheApplic
     EXPECT_FALSE(ad_.problem_view);
     EXPECT_EQ(ad_.auto_saved_id, 0);
     EXPECT_EQ(reports(), before - 1);
-    EXPECT_EQ(query("SELECT count(*) FROM TABLE_VOC WHERE VOC_ID=" + std::to_string(draft->id)), "1");
+    EXPECT_EQ(value("SELECT count(*) FROM TABLE_VOC WHERE VOC_ID=" + std::to_string(draft->id)), "1");
   }
 }
 
@@ -210,6 +290,23 @@ TEST_F(Compose, DraftIsNotDiscardedWithoutAQuestionAndItsLogGoesWithIt) {
   EXPECT_FALSE(view());
   EXPECT_EQ(reports(), before - 1);
   EXPECT_FALSE(std::filesystem::exists(log));
+}
+
+TEST_F(Compose, DoubleTapDoesNotThrowARecordingAway) {
+  ad_.minicontrol_layout = tavro_hoverui_layout_add(ad_.win, "minicontrol", "minicontrol_video");
+  ASSERT_TRUE(ad_.minicontrol_layout);
+  add_discard_button(&ad_);
+  Evas_Object *discard = elm_object_part_content_get(ad_.minicontrol_layout, "cancel_btn_swallow");
+  ad_.recording_status = 1;
+  const double now = ecore_loop_time_get();
+  for (const double seconds_ago : {1.0, 0.7, 0.0}) {
+    ecore_loop_time_set(now - seconds_ago);
+    evas_object_smart_callback_call(discard, "clicked", nullptr);
+    EXPECT_EQ(ad_.cancel_video_recording == 1, seconds_ago == 0);
+  }
+  evas_object_del(ad_.minicontrol_layout);
+  ad_.minicontrol_layout = nullptr;
+  ad_.recording_status = ad_.cancel_video_recording = 0;
 }
 
 TEST_F(Compose, DraftThatIsStoredAnewKeepsItsLogAndLosesOneThatWasReplaced) {

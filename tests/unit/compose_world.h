@@ -3,12 +3,12 @@
 
 #include <app_preference.h>
 
-#include <filesystem>
-#include <fstream>
 #include <string>
 #include <vector>
 
+#include "files.h"
 #include "screens_world.h"
+#include "store_access.h"
 #include "tavro_compose.h"
 #include "tavro_memory.h"
 #include "tavro_preferences.h"
@@ -17,10 +17,8 @@ using Voc = TavroHandle<svc_voc_data, tavro_dbmgr_free_voc_data>;
 
 constexpr char kComposeMedia[] = "/opt/usr/media/compose-test/";
 
-inline std::string make_file(const std::string &name, std::string content, off_t size = 0) {
-  const std::string path = kComposeMedia + name;
-  std::filesystem::create_directories(kComposeMedia);
-  std::ofstream(path) << content;
+inline std::string make_file(const std::string &name, const std::string &content, off_t size = 0) {
+  const std::string path = write_file(kComposeMedia + name, content);
   if (size > 0) std::filesystem::resize_file(path, static_cast<uintmax_t>(size));
   return path;
 }
@@ -64,18 +62,9 @@ class Compose : public Screens {
     return names;
   }
 
-  static std::string query(const std::string &sql) {
-    TavroDb db;
-    sqlite3_open(TAVRO_DBMGR_FILE, tavro_out(db));
-    sqlite3_stmt *raw = nullptr;
-    EXPECT_EQ(sqlite3_prepare_v2(db.get(), sql.c_str(), -1, &raw, nullptr), SQLITE_OK) << sql;
-    const TavroStmt statement(raw);
-    const bool has_row = sqlite3_step(raw) == SQLITE_ROW && sqlite3_column_text(raw, 0);
-    return has_row ? reinterpret_cast<const char *>(sqlite3_column_text(raw, 0)) : "";
-  }
-  static int reports() { return std::stoi(query("SELECT count(*) FROM TABLE_VOC")); }
+  static int reports() { return std::stoi(value("SELECT count(*) FROM TABLE_VOC")); }
   static std::string newest(const std::string &column) {
-    return query("SELECT " + column + " FROM TABLE_VOC_EXTENDED ORDER BY VOC_ID DESC LIMIT 1");
+    return value("SELECT " + column + " FROM TABLE_VOC_EXTENDED ORDER BY VOC_ID DESC LIMIT 1", "", "");
   }
 
   svc_voc_data *store_draft(const char *log = nullptr) {

@@ -111,7 +111,7 @@ TEST_F(Collection, WhatCannotBeArchivedGivesTheRightResultAndNoArchive) {
   EXPECT_EQ(collect(), -1) << "no dump folder";
   fs::create_directories(kDumps);
   EXPECT_EQ(collect(), 1);
-  make_file(kDumps + "a file.cs", "is no folder");
+  write_file(kDumps + "a file.cs", "is no folder");
   EXPECT_EQ(collect(), 1);
   make_folder("a_1", 1000, {});
   EXPECT_EQ(collect(), -1) << "no files";
@@ -122,13 +122,13 @@ TEST_F(Collection, WhatCannotBeArchivedGivesTheRightResultAndNoArchive) {
   make_folder("a_1", 1000, {"x.cs"});
   EXPECT_EQ(_tavro_dc_zip_files((kDumps + "a_1/x.cs").c_str(), nullptr, nullptr, "a_/../../x"), -1);
   fs::remove_all(kArchives);
-  make_file(kArchives.substr(0, kArchives.size() - 1), "the archive folder is a file");
+  write_file(kArchives.substr(0, kArchives.size() - 1), "the archive folder is a file");
   EXPECT_EQ(collect(), -1);
   fs::remove(kArchives.substr(0, kArchives.size() - 1));
 }
 
 TEST_F(Collection, LinksAndPipesAreLeftOutWhereverTheyStand) {
-  make_file("/opt/usr/secret/x.cs", "secret");
+  write_file("/opt/usr/secret/x.cs", "secret");
   fs::create_directory_symlink("/opt/usr/secret", kDumps + "linked_9");
   make_folder("pipes_8", 4000, {});
   ASSERT_EQ(mkfifo((kDumps + "pipes_8/x.coredump.gz").c_str(), 0600), 0);
@@ -151,7 +151,7 @@ TEST_F(Collection, LinksAndPipesAreLeftOutWhereverTheyStand) {
 
 TEST_F(Collection, AFileThatCannotBeAddedLeavesAWholeArchiveOfTheOthers) {
   make_folder("a_1", 1000, {"x.cs", "x.log.gz"});
-  make_file(kDumps + "a_1/x.coredump.gz", noise(300000));
+  write_file(kDumps + "a_1/x.coredump.gz", noise(300000));
   EXPECT_EQ(on_a_full_disk(100000, [] { return collect(); }), 0);
   EXPECT_THAT(entries_of("tavro_1.zip"), ElementsAre("x.cs", "x.log.gz"));
   EXPECT_EQ(
@@ -172,7 +172,7 @@ TEST_F(Collection, AFileThatCannotBeAddedLeavesAWholeArchiveOfTheOthers) {
 TEST_F(Collection, AFullDiskLeavesNothingAndTheArchiveOfEarlierAsItWas) {
   make_folder("a_1", 1000, {"x.cs"});
   ASSERT_EQ(collect(), 0);
-  make_file(kDumps + "a_1/x.cs", noise(50000));
+  write_file(kDumps + "a_1/x.cs", noise(50000));
   // At every step of writing: an entry's head, its content, its end, the archive's end.
   for (const rlim_t size : {0u, 20u, 9000u, 50010u, 50080u})
     EXPECT_NE(on_a_full_disk(size, [] { return collect(); }), 0) << size;
@@ -181,7 +181,7 @@ TEST_F(Collection, AFullDiskLeavesNothingAndTheArchiveOfEarlierAsItWas) {
   EXPECT_EQ(collect(), 0);
   EXPECT_GT(fs::file_size(kArchives + "tavro_1.zip"), 50000u);
   // However many files it does not take, one line says so.
-  for (const char *name : {"x.coredump.gz", "x.log.gz"}) make_file(kDumps + "a_1/" + name, noise(50000));
+  for (const char *name : {"x.coredump.gz", "x.log.gz"}) write_file(kDumps + "a_1/" + name, noise(50000));
   fs::remove("/opt/usr/share/log/platform.log");
   EXPECT_NE(on_a_full_disk(9000, [] { return collect(); }), 0);
   std::ifstream log("/opt/usr/share/log/platform.log");
@@ -191,8 +191,8 @@ TEST_F(Collection, AFullDiskLeavesNothingAndTheArchiveOfEarlierAsItWas) {
 }
 
 TEST_F(Collection, TheArchiveIsPrivateDatedAndReplacesAnEarlierOneAndWhatAKilledRunLeft) {
-  make_file(kArchives + "tavro_1.zip", "an earlier one");
-  make_file(kArchives + ".tavro_dc.0.part", std::string(5000, 'x'));
+  write_file(kArchives + "tavro_1.zip", "an earlier one");
+  write_file(kArchives + ".tavro_dc.0.part", std::string(5000, 'x'));
   fs::permissions(kArchives + ".tavro_dc.0.part", fs::perms::owner_read | fs::perms::owner_write);
   make_folder("a_1", 1000, {"x.cs"});
   const timespec times[] = {{1700000000, 0}, {1700000000, 0}};

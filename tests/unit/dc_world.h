@@ -8,26 +8,21 @@
 #include <atomic>
 #include <chrono>
 #include <filesystem>
-#include <fstream>
 #include <string>
 #include <thread>
 #include <vector>
 
+#include "files.h"
 #include "tavro_crash_service.h"
 #include "tavro_dc_private.h"
 
 class DcWorld : public ::testing::Test {
  protected:
-  static void make_file(const std::string &path, const std::string &content) {
-    std::filesystem::create_directories(std::filesystem::path(path).parent_path());
-    std::ofstream(path) << content;
-  }
-
   // A folder that last changed at `time`, with files of these names.
   static void make_folder(const std::string &name, long time, const std::vector<std::string> &files) {
     const std::string path = TAVRO_CRASH_DUMP_FOLDER + name;
     std::filesystem::create_directories(path);
-    for (const std::string &file : files) make_file(path + "/" + file, "content of " + file);
+    for (const std::string &file : files) write_file(path + "/" + file, "content of " + file);
     const timespec times[] = {{time, 0}, {time, 0}};
     utimensat(AT_FDCWD, path.c_str(), times, 0);
   }

@@ -1,11 +1,10 @@
 // Deleting reports: what goes, what stays, and the time to think again. Widgets are real and painted into
 // memory.
-#define EFL_BETA_API_SUPPORT  // reading what a screen reader is told
-#include <Elementary.h>
 #include <app_preference.h>
 
 #include <random>
 
+#include "screens_world.h"
 #include "store_world.h"
 #include "tavro-common.h"
 #include "tavro-main.h"
@@ -30,12 +29,6 @@ const std::string kDumps = "/opt/usr/media/Orbel/";
 
 int redraws = 0;
 int confirmations = 0;
-
-std::string make_file(const std::string &path) {
-  fs::create_directories(fs::path(path).parent_path());
-  std::ofstream(path) << "content";
-  return path;
-}
 
 struct named_files {
   std::vector<std::string> attachments;
@@ -84,27 +77,18 @@ class Delete : public StoreWorld {
     StoreWorld::TearDown();
   }
 
-  static Evas_Object *find_button(Evas_Object *below, const char *name) {
-    if (elm_object_widget_check(below) && g_strcmp0(efl_access_object_i18n_name_get(below), name) == 0)
-      return below;
-    const TavroHandle<Eina_List, eina_list_free> members(evas_object_smart_members_get(below));
-    Evas_Object *found = nullptr;
-    for (Eina_List *link = members.get(); link && !found; link = eina_list_next(link))
-      found = find_button(static_cast<Evas_Object *>(eina_list_data_get(link)), name);
-    return found;
-  }
   bool touch(const char *name) {
-    for (Evas_Object *top = evas_object_top_get(evas_object_evas_get(ad_.win)); top;
-         top = evas_object_below_get(top))
-      if (Evas_Object *button = find_button(top, name)) {
-        evas_object_smart_callback_call(button, "clicked", nullptr);
-        return true;
-      }
-    return false;
+    Evas_Object *button = find_top_button(ad_.win, name);
+    if (button) evas_object_smart_callback_call(button, "clicked", nullptr);
+    return button;
   }
   void ask_and_confirm(const std::vector<int> &ids) {
     tavro_delete_reports(&ad_, ids, [](appdata *) { confirmations++; });
     ASSERT_TRUE(touch("IDS_OB_BUTTON_DELETE_ABB5"));
+  }
+  void delete_now(const std::vector<int> &ids) {
+    ask_and_confirm(ids);
+    tavro_delete_finish(&ad_);
   }
   static bool is_stored(int id) {
     return value("SELECT count(*) FROM TABLE_VOC WHERE VOC_ID = " + std::to_string(id)) == "1";
@@ -121,17 +105,18 @@ class Delete : public StoreWorld {
 };
 
 TEST_F(Delete, OnlyFilesThatTheClientMadeGo) {
-  const std::string gone[] = {make_file(kOwn + "edited.jpg"), make_file(kOwn + "status.txt"),
-                              make_file(kLogs + "SystemLog_1.zip"), make_file(kDumps + "tavro_1.zip"),
-                              make_file(kOwn + "by a detour.jpg")};
-  const std::string kept[] = {make_file(kGallery + "a.jpg"),      make_file(kGallery + "b.jpg"),
-                              make_file(kGallery + "linked.jpg"), make_file(kGallery + "log.zip"),
-                              make_file(kLogs + "other.zip"),     make_file(kOwn + "below/c.jpg"),
-                              make_file("/opt/usr/share/d.jpg"),  make_file(kOwn + "nobody's.jpg"),
-                              make_file(kOwn + "shared.jpg"),     make_file(kOwn + "it's shared.txt")};
+  const std::string gone[] = {
+      write_file(kOwn + "edited.jpg"),       write_file(kOwn + "status.txt"),
+      write_file(kLogs + "SystemLog_1.zip"), write_file(kDumps + "tavro_1.zip"),
+      write_file(kOwn + "by a detour.mp4"),  write_file(kOwn + ".by a detour.mp4.jpg")};
+  const std::string kept[] = {write_file(kGallery + "a.jpg"),      write_file(kGallery + "b.jpg"),
+                              write_file(kGallery + "linked.jpg"), write_file(kGallery + "log.zip"),
+                              write_file(kLogs + "other.zip"),     write_file(kOwn + "below/c.jpg"),
+                              write_file("/opt/usr/share/d.jpg"),  write_file(kOwn + "nobody's.jpg"),
+                              write_file(kOwn + "shared.jpg"),     write_file(kOwn + "it's shared.txt")};
   fs::create_symlink(kGallery + "linked.jpg", kOwn + "link.jpg");
   fs::create_directory_symlink(kGallery, kOwn + "folder");
-  const int id = store_report({{gone[0], kOwn + "../VantorCommunity/by a detour.jpg", kept[0],
+  const int id = store_report({{gone[0], kOwn + "../VantorCommunity/by a detour.mp4", kept[0],
                                 kOwn + "../DCIM/b.jpg", kOwn + "link.jpg", kOwn + "folder/linked.jpg",
                                 kept[4], kept[5], kept[6], kept[8], kOwn, "VantorCommunity/edited.jpg", ""},
                                gone[2],
@@ -139,8 +124,7 @@ TEST_F(Delete, OnlyFilesThatTheClientMadeGo) {
                                gone[1]});
   const int with_log_in_gallery = store_report({{}, kept[3], kept[0], kept[9]});
   const int other = store_report({{kGallery + "../VantorCommunity/shared.jpg"}, "", "", kept[9]});
-  ask_and_confirm({id, with_log_in_gallery});
-  tavro_delete_finish(&ad_);
+  delete_now({id, with_log_in_gallery});
   for (const std::string &path : gone) EXPECT_FALSE(fs::exists(path)) << path;
   for (const std::string &path : kept) EXPECT_TRUE(fs::exists(path)) << path;
   EXPECT_TRUE(fs::is_symlink(kOwn + "link.jpg"));
@@ -148,15 +132,14 @@ TEST_F(Delete, OnlyFilesThatTheClientMadeGo) {
 }
 
 TEST_F(Delete, AFolderThatIsALinkToTheGalleryIsNotTheClientsOwn) {
-  const std::string picture = make_file(kGallery + "a.jpg");
+  const std::string picture = write_file(kGallery + "a.jpg");
   fs::create_directory_symlink(kGallery, kOwn.substr(0, kOwn.size() - 1));
-  ask_and_confirm({store_report({{kOwn + "a.jpg"}, "", kOwn + "a.jpg", ""})});
-  tavro_delete_finish(&ad_);
+  delete_now({store_report({{kOwn + "a.jpg"}, "", kOwn + "a.jpg", ""})});
   EXPECT_TRUE(fs::exists(picture));
 }
 
 TEST_F(Delete, ReportsAreHiddenUntilTheTimeIsUpAndComeBackWhenItIsUndone) {
-  const std::string path = make_file(kOwn + "edited.jpg");
+  const std::string path = write_file(kOwn + "edited.jpg");
   const int id = store_report({{path}, "", "", ""}), unread = store_report({});
   run("UPDATE TABLE_VOC SET VOC_PUSH_READ = 0");
   tavro_delete_reports(&ad_, {id}, nullptr);
@@ -179,12 +162,11 @@ TEST_F(Delete, ReportsAreHiddenUntilTheTimeIsUpAndComeBackWhenItIsUndone) {
 }
 
 TEST_F(Delete, AStoreThatRefusesKeepsEverythingAndShowsItAgain) {
-  const std::string paths[] = {make_file(kOwn + "a.jpg"), make_file(kOwn + "b.jpg")};
+  const std::string paths[] = {write_file(kOwn + "a.jpg"), write_file(kOwn + "b.jpg")};
   const int ids[] = {store_report({{paths[0]}, "", "", ""}), store_report({{paths[1]}, "", "", ""})};
   run("CREATE TRIGGER no BEFORE DELETE ON TABLE_VOC WHEN old.VOC_ID = " + std::to_string(ids[1]) +
       " BEGIN SELECT RAISE(ABORT, 'full'); END");
-  ask_and_confirm({ids[0], ids[1]});
-  tavro_delete_finish(&ad_);
+  delete_now({ids[0], ids[1]});
   for (const int i : {0, 1}) {
     EXPECT_EQ(rows_of(ids[i]), "111");
     EXPECT_TRUE(fs::exists(paths[i]));
@@ -195,7 +177,7 @@ TEST_F(Delete, AStoreThatRefusesKeepsEverythingAndShowsItAgain) {
 }
 
 TEST_F(Delete, AReportThatIsSentMeanwhileStaysWithItsFiles) {
-  const std::string path = make_file(kOwn + "a.jpg");
+  const std::string path = write_file(kOwn + "a.jpg");
   const int sending = store_report({{path}, "", "", ""}, TAVRO_STATUS_SENDING_FAILED),
             answered = store_report({}, TAVRO_STATUS_SENDING_FAILED), other = store_report({});
   ask_and_confirm({sending, answered, other});
@@ -208,12 +190,11 @@ TEST_F(Delete, AReportThatIsSentMeanwhileStaysWithItsFiles) {
 
 TEST_F(Delete, TheScreenOfADraftGoesWithItUnlessMoreWasWrittenThere) {
   for (const bool is_changed : {false, true}) {
-    const int id = store_report({{make_file(kOwn + "a.jpg")}, "", "", ""}, TAVRO_STATUS_DRAFT_SAVED);
+    const int id = store_report({{write_file(kOwn + "a.jpg")}, "", "", ""}, TAVRO_STATUS_DRAFT_SAVED);
     const Voc draft(tavro_dbmgr_get_voc_by_id(id));
     tavro_create_problem_page(&ad_, draft.get());
     if (is_changed) elm_entry_entry_set(tavro_compose_view(&ad_)->entry, "more");
-    ask_and_confirm({id});
-    tavro_delete_finish(&ad_);
+    delete_now({id});
     EXPECT_EQ(tavro_compose_view(&ad_) != nullptr, is_changed);
     EXPECT_EQ(is_stored(id), is_changed);
   }
@@ -221,15 +202,14 @@ TEST_F(Delete, TheScreenOfADraftGoesWithItUnlessMoreWasWrittenThere) {
 
 TEST_F(Delete, WhatAKilledScreensWritingNamesStaysUntilThatIsGone) {
   constexpr char kKilled[] = TAVRO_COMPOSE_KEEPER_FILE ".2";
-  const std::string picture = make_file(kOwn + "a.jpg"), dump = make_file(kDumps + "tavro_1.zip");
+  const std::string picture = write_file(kOwn + "a.jpg"), dump = write_file(kDumps + "tavro_1.zip");
   const int id = store_report({{picture}, "", dump, ""}, TAVRO_STATUS_DRAFT_SAVED);
   const Voc draft(tavro_dbmgr_get_voc_by_id(id));
   tavro_create_problem_page(&ad_, draft.get());
   tavro_compose_keeper_keep_all();
   tavro_compose_keeper_flush();
   fs::copy_file(TAVRO_COMPOSE_KEEPER_FILE, kKilled);
-  ask_and_confirm({id});
-  tavro_delete_finish(&ad_);
+  delete_now({id});
   EXPECT_FALSE(is_stored(id) || fs::exists(TAVRO_COMPOSE_KEEPER_FILE));
   tavro_crash_archive_delete_unneeded(dump);
   EXPECT_TRUE(fs::exists(picture) && fs::exists(dump));
@@ -238,38 +218,25 @@ TEST_F(Delete, WhatAKilledScreensWritingNamesStaysUntilThatIsGone) {
   EXPECT_FALSE(fs::exists(picture) || fs::exists(dump));
 }
 
-// A deletion in a process that is killed: by itself behind a step, or from outside after a while.
-class DeletionToBeKilled {
- public:
-  DeletionToBeKilled(int id, int last_step) {
-    EXPECT_EQ(pipe(begin_), 0);
-    pid_ = start_process([=] {
-      std::vector<int> gone;
-      if (write(begin_[1], "x", 1) != 1) return 1;
-      tavro_deleted_files_note({id});
-      if (last_step == 1) raise(SIGKILL);
-      tavro_dbmgr_destroy_vocs_by_ids({id}, &gone);
-      if (last_step == 2) raise(SIGKILL);
-      tavro_deleted_files_remove();
-      return 0;
-    });
-    char byte;
-    EXPECT_EQ(read(begin_[0], &byte, 1), 1);
-  }
-  ~DeletionToBeKilled() {
-    for (const int end : begin_) close(end);
-  }
-  void kill_after(useconds_t microseconds) {
-    usleep(microseconds);
-    kill(pid_, SIGKILL);
-  }
-  // Its exit status, -1 when it was killed.
-  int end() { return end_of(pid_); }
-
- private:
-  int begin_[2];
-  pid_t pid_;
-};
+// A deletion in a process of its own, which has begun; it kills itself behind a step (0: it does not).
+pid_t start_deletion(int id, int last_step) {
+  int begin[2];
+  EXPECT_EQ(pipe(begin), 0);
+  const pid_t pid = start_process([=] {
+    std::vector<int> gone;
+    if (write(begin[1], "x", 1) != 1) return 1;
+    tavro_deleted_files_note({id});
+    if (last_step == 1) raise(SIGKILL);
+    tavro_dbmgr_destroy_vocs_by_ids({id}, &gone);
+    if (last_step == 2) raise(SIGKILL);
+    tavro_deleted_files_remove();
+    return 0;
+  });
+  char byte;
+  EXPECT_EQ(read(begin[0], &byte, 1), 1);
+  for (const int end : begin) close(end);
+  return pid;
+}
 
 TEST_F(Delete, AKillAtAnyMomentLeavesNoReportWithoutItsFilesAndNoFileForLong) {
   constexpr int kToItsEnd = 0, kRandomKills = 40;
@@ -279,12 +246,15 @@ TEST_F(Delete, AKillAtAnyMomentLeavesNoReportWithoutItsFilesAndNoFileForLong) {
   std::uniform_real_distribution<> part(0.0, 1.2);
   double seconds = 0.0;
   for (int turn = 0; turn < 3 + kRandomKills; turn++) {
-    const std::string path = make_file(kOwn + "a.jpg"), log_path = make_file(kLogs + "SystemLog_1.zip");
+    const std::string path = write_file(kOwn + "a.jpg"), log_path = write_file(kLogs + "SystemLog_1.zip");
     const int id = store_report({{path}, log_path, "", ""});
     const double start = ecore_time_get();
-    DeletionToBeKilled deletion(id, turn < 3 ? turn : kToItsEnd);
-    if (turn >= 3) deletion.kill_after(static_cast<useconds_t>(1e6 * seconds * part(random)));
-    const bool is_killed = deletion.end() == -1;
+    const pid_t deletion = start_deletion(id, turn < 3 ? turn : kToItsEnd);
+    if (turn >= 3) {
+      usleep(static_cast<useconds_t>(1e6 * seconds * part(random)));
+      kill(deletion, SIGKILL);
+    }
+    const bool is_killed = end_of(deletion) == -1;
     if (turn == 0) seconds = ecore_time_get() - start;
     tavro_dbmgr_init_semaphore();
     const bool is_there = is_stored(id);

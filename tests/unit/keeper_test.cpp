@@ -5,9 +5,10 @@
 #include <sys/stat.h>
 
 #include <filesystem>
-#include <fstream>
 
+#include "files.h"
 #include "screens_world.h"
+#include "store_access.h"
 #include "tavro_app_control_handle.h"
 #include "tavro_appdata.h"
 #include "tavro_autosave.h"
@@ -38,9 +39,7 @@ constexpr char kDiscard[] = "IDS_OB_BUTTON_DISCARD";
 
 // A plain file of a kind that support can open, except for its content.
 std::string make_picture(const std::string &path, const std::string &head = "\xFF\xD8\xFF") {
-  fs::create_directories(fs::path(path).parent_path());
-  std::ofstream(path) << head << "and some more bytes";
-  return path;
+  return write_file(path, head + "and some more bytes");
 }
 
 class Keeper : public Screens {
@@ -60,11 +59,18 @@ class Keeper : public Screens {
     Screens::start();
     tavro_compose_keeper_offer(&ad_);
   }
-  void die_and_start() {
+  static void keep() {
     tavro_compose_keeper_note();
     tavro_compose_keeper_flush();
+  }
+  void start_again(const char *user = "anna") {
     end();
+    preference_set_string(TAVRO_PREF_USERNAME, user);
     start();
+  }
+  void die_and_start(const char *user = "anna") {
+    keep();
+    start_again(user);
   }
   void write(const char *title, const char *text, bool has_picture = false) {
     compose_view_win *view = tavro_compose_view(&ad_);
@@ -80,16 +86,11 @@ class Keeper : public Screens {
   // Touch the button of the question that is shown: the topmost of that name.
   void answer(const char *name) {
     ASSERT_TRUE(ad_.cancel_popup);
-    Evas_Object *button = nullptr;
-    for (Evas_Object *top = evas_object_top_get(evas_object_evas_get(ad_.win)); top && !button;
-         top = evas_object_below_get(top))
-      button = find_button(top, tavro_text(name));
+    Evas_Object *button = find_top_button(ad_.win, tavro_text(name));
     ASSERT_TRUE(button) << name;
-    evas_object_smart_callback_call(button, "clicked", nullptr);
+    tap(button);
   }
-  std::string question() {
-    return ad_.cancel_popup ? efl_access_object_description_get(ad_.cancel_popup) : "";
-  }
+  std::string question() { return body(ad_.cancel_popup); }
 
   static std::vector<std::string> kept_files() {
     std::vector<std::string> names;
@@ -211,20 +212,14 @@ TEST_F(Keeper, WhatWasNotDecidedStaysBesideWhatIsWrittenNext) {
 
 TEST_F(Keeper, IsOfferedToThePersonWhoWroteItOnly) {
   write_problem("Anna's");
-  tavro_compose_keeper_note();
-  tavro_compose_keeper_flush();
-  end();
-  preference_set_string(TAVRO_PREF_USERNAME, "berta");
-  start();
+  die_and_start("berta");
   EXPECT_FALSE(ad_.cancel_popup);
   write_problem("Berta's");
-  die_and_start();
+  die_and_start("berta");
   EXPECT_THAT(question(), HasSubstr("Berta's"));
   answer(kDiscard);
   EXPECT_FALSE(ad_.cancel_popup);
-  end();
-  preference_set_string(TAVRO_PREF_USERNAME, "anna");
-  start();
+  start_again();
   EXPECT_THAT(question(), HasSubstr("Anna's"));
 }
 
@@ -246,8 +241,7 @@ TEST_F(Keeper, SurvivesThatTheDraftItCameFromIsGoneOrWasSentMeanwhile) {
   for (const bool is_sent : {false, true}) {
     const int id = open_stored_draft("before");
     write("after", "");
-    tavro_compose_keeper_note();
-    tavro_compose_keeper_flush();
+    keep();
     if (is_sent)
       tavro_dbmgr_update_sending_state(id, TAVRO_STATUS_SENDING);
     else
@@ -265,23 +259,16 @@ TEST_F(Keeper, SurvivesThatTheDraftItCameFromIsGoneOrWasSentMeanwhile) {
 TEST_F(Keeper, OfAReportThatWasStoredJustBeforeTheEndIsNotOfferedAgain) {
   open_stored_draft("before");
   write("after", "all of it", true);
-  tavro_compose_keeper_note();
-  tavro_compose_keeper_flush();
+  keep();
   // The saver alone, without what follows it.
   ASSERT_GE(tavro_save_problem_compose_data(&ad_, TAVRO_STATUS_SENDING), 1);
-  end();
-  start();
+  start_again();
   EXPECT_FALSE(ad_.cancel_popup);
   EXPECT_THAT(kept_files(), IsEmpty());
   EXPECT_THAT(reports(), ElementsAre("10 after|all of it|1"));
 }
 
 TEST_F(Keeper, StaysWhenTheStoreRefusesTheDraftAtTheEnd) {
-  const auto run = [](const char *sql) {
-    TavroDb db;
-    sqlite3_open(TAVRO_DBMGR_FILE, tavro_out(db));
-    EXPECT_EQ(sqlite3_exec(db.get(), sql, nullptr, nullptr, nullptr), SQLITE_OK);
-  };
   write_problem("the last word");
   tavro_compose_keeper_note();
   run("CREATE TRIGGER refusal BEFORE INSERT ON TABLE_VOC BEGIN SELECT RAISE(FAIL, 'full'); END");
@@ -302,8 +289,7 @@ TEST_F(Keeper, OnAFullDiskTriesAgainAtTheNextChange) {
   // What cannot be opened for writing stands in for the disk.
   fs::create_directory(TAVRO_COMPOSE_KEEPER_FILE ".new");
   write_problem("one");
-  tavro_compose_keeper_note();
-  tavro_compose_keeper_flush();
+  keep();
   EXPECT_THAT(kept_files(), ElementsAre(".tavro.compose.new"));
   fs::remove(TAVRO_COMPOSE_KEEPER_FILE ".new");
   die_and_start();
@@ -328,8 +314,7 @@ TEST_F(Keeper, SetsADamagedFileAsideAndReadsOneOfALaterVersion) {
   };
   for (const auto &given : cases) {
     std::ofstream(TAVRO_COMPOSE_KEEPER_FILE) << given.content;
-    end();
-    start();
+    start_again();
     EXPECT_EQ(ad_.cancel_popup != nullptr, given.is_good) << given.content;
     if (!given.is_good) {
       EXPECT_THAT(kept_files(), ElementsAre(".tavro.compose.damaged"));
@@ -341,8 +326,7 @@ TEST_F(Keeper, SetsADamagedFileAsideAndReadsOneOfALaterVersion) {
   }
   std::ofstream(TAVRO_COMPOSE_KEEPER_FILE ".damaged") << "an earlier one";
   fs::create_directory(TAVRO_COMPOSE_KEEPER_FILE);
-  end();
-  start();
+  start_again();
   EXPECT_THAT(kept_files(), ElementsAre(".tavro.compose.damaged", ".tavro.compose.damaged.2"));
 }
 

@@ -68,18 +68,6 @@ TEST_F(MemoryTracker, RemovingAnUnknownBlockIsLoggedAndChangesNothing) {
   EXPECT_THAT(report().back(), EndsWith("total leak = 1"));
 }
 
-TEST_F(MemoryTracker, BlockTakesTheLowestFreeSlot) {
-  char blocks[4];
-  for (int i = 0; i < 3; i++) tavro_mem_insert(&blocks[i], i, "a.cpp");
-  tavro_mem_remove(&blocks[1], 0, "a.cpp");
-  EXPECT_EQ(gMemDb[1].slotfree, 0);
-  EXPECT_EQ(gMemDb[1].ptr, &blocks[1]);
-  tavro_mem_insert(&blocks[3], 40, "b.cpp");
-  EXPECT_EQ(gMemDb[1].slotfree, 1);
-  EXPECT_EQ(gMemDb[1].ptr, &blocks[3]);
-  EXPECT_EQ(gMemDb[1].lineNo, 40);
-}
-
 TEST_F(MemoryTracker, EveryStepChangesTheSlotThatAScanWouldFind) {
   struct expected_slot {
     char *ptr;
@@ -97,10 +85,11 @@ TEST_F(MemoryTracker, EveryStepChangesTheSlotThatAScanWouldFind) {
     });
     if (found == expected.end()) continue;
     *found = {block, inserts ? 1 : 0};
-    (inserts ? tavro_mem_insert : tavro_mem_remove)(block, 1, "a.cpp");
+    (inserts ? tavro_mem_insert : tavro_mem_remove)(block, step, "a.cpp");
     const tavro_meminfo_s &slot = gMemDb[found - expected.begin()];
     ASSERT_EQ(slot.ptr, found->ptr) << "step " << step;
     ASSERT_EQ(slot.slotfree, found->in_use) << "step " << step;
+    ASSERT_TRUE(!inserts || slot.lineNo == step) << "step " << step;
   }
   EXPECT_THAT(new_lines(), IsEmpty());
 }

@@ -1,16 +1,14 @@
 // The gallery's files and their thumbnails: what is listed, how it is shrunk, what is refused, what is
 // cached.
 #include <gmock/gmock.h>
-#include <image_util.h>
-#include <png.h>
 #include <sys/stat.h>
 #include <utime.h>
 
 #include <cmath>
 #include <filesystem>
 #include <fstream>
-#include <iterator>
 
+#include "picture_files.h"
 #include "tavro_gallery.h"
 #include "tavro_picture_info.h"
 #include "tavro_thumbnail_maker.h"
@@ -26,61 +24,10 @@ constexpr char kRoot[] = "/opt/usr/media/pictures-test";
 constexpr uint32_t kRed = 0xFFFF0000, kBlue = 0xFF0000FF, kWhite = 0xFFFFFFFF;
 
 std::string make_file(const std::string &path, const std::string &bytes, time_t changed = 1000) {
-  fs::create_directories(fs::path(path).parent_path());
-  std::ofstream(path, std::ios::binary) << bytes;
+  write_file(path, bytes);
   const utimbuf times{changed, changed};
   utime(path.c_str(), &times);
   return path;
-}
-
-std::string bytes_of(const std::string &path) {
-  std::ifstream file(path, std::ios::binary);
-  return {std::istreambuf_iterator<char>(file), {}};
-}
-
-// A JPEG whose left half has one colour and whose right half another.
-std::string jpeg_bytes(int width, int height, uint32_t left, uint32_t right) {
-  std::vector<uint32_t> pixels;
-  for (int i = 0; i < width * height; ++i) pixels.push_back(i % width < width / 2 ? left : right);
-  const std::string path = "/opt/usr/jpeg_bytes.jpg";
-  EXPECT_EQ(image_util_encode_jpeg(reinterpret_cast<unsigned char *>(pixels.data()), width, height,
-                                   IMAGE_UTIL_COLORSPACE_BGRA8888, 95, path.c_str()),
-            IMAGE_UTIL_ERROR_NONE);
-  return bytes_of(path);
-}
-
-std::string with_orientation(const std::string &jpeg, char orientation) {
-  const std::string exif = std::string("Exif\0\0MM\0*\0\0\0\x08\0\x01\x01\x12\0\x03\0\0\0\x01\0", 25) +
-                           orientation + std::string(6, '\0');
-  return jpeg.substr(0, 2) + "\xFF\xE1" + std::string(1, '\0') + static_cast<char>(exif.size() + 2) + exif +
-         jpeg.substr(2);
-}
-
-// The header claims a size that nobody made.
-std::string with_claimed_side(std::string jpeg, unsigned char marker, char high, char low) {
-  const size_t frame = jpeg.find("\xFF\xC0");
-  jpeg[frame + 1] = static_cast<char>(marker);
-  jpeg[frame + 5] = jpeg[frame + 7] = high;
-  jpeg[frame + 6] = jpeg[frame + 8] = low;
-  return jpeg;
-}
-
-std::string transparent_png(int side) {
-  const std::vector<uint32_t> pixels(static_cast<size_t>(side) * static_cast<size_t>(side), 0x00FF0000);
-  png_image png{};
-  png.version = PNG_IMAGE_VERSION;
-  png.width = png.height = static_cast<png_uint_32>(side);
-  png.format = PNG_FORMAT_BGRA;
-  const std::string path = "/opt/usr/transparent.png";
-  EXPECT_TRUE(png_image_write_to_file(&png, path.c_str(), 0, pixels.data(), 0, nullptr));
-  return bytes_of(path);
-}
-
-bool is_near(uint32_t colour, uint32_t expected) {
-  for (int shift = 0; shift < 24; shift += 8)
-    if (std::abs(static_cast<int>(colour >> shift & 0xFF) - static_cast<int>(expected >> shift & 0xFF)) > 12)
-      return false;
-  return true;
 }
 
 class Pictures : public testing::Test {
@@ -136,9 +83,9 @@ TEST_F(Pictures, ThumbnailIsTheUprightMiddleOfThePicture) {
         make_file(in_root("held.jpg"), with_orientation(wide, expected.orientation), expected.orientation);
     const tavro_thumbnail_pixels pixels = tavro_thumbnail_make(path, 16);
     ASSERT_EQ(pixels.size(), 256u);
-    EXPECT_TRUE(is_near(pixels[0], expected.top_left)) << int(expected.orientation);
-    EXPECT_TRUE(is_near(pixels[15], expected.top_right)) << int(expected.orientation);
-    EXPECT_TRUE(is_near(pixels[240], expected.bottom_left)) << int(expected.orientation);
+    EXPECT_THAT(pixels[0], IsNear(expected.top_left)) << int(expected.orientation);
+    EXPECT_THAT(pixels[15], IsNear(expected.top_right)) << int(expected.orientation);
+    EXPECT_THAT(pixels[240], IsNear(expected.bottom_left)) << int(expected.orientation);
   }
 }
 
@@ -146,7 +93,7 @@ TEST_F(Pictures, WhatIsTransparentIsShownOnWhite) {
   const tavro_thumbnail_pixels pixels =
       tavro_thumbnail_make(make_file(in_root("glass.png"), transparent_png(64)), 8);
   ASSERT_EQ(pixels.size(), 64u);
-  EXPECT_TRUE(is_near(pixels[0], kWhite));
+  EXPECT_THAT(pixels[0], IsNear(kWhite));
 }
 
 TEST_F(Pictures, WhatIsNoPictureOrWouldCostTooMuchHasNoThumbnail) {
@@ -185,21 +132,21 @@ TEST_F(Pictures, AThumbnailIsKeptForThisUserUntilItsFileChanges) {
   // The thumbnail of another picture in its place shows where it is taken from.
   const std::string other = make_file(in_root("other.jpg"), blue);
   tavro_thumbnail_make(other, 16);
-  make_file(entry, bytes_of(tavro_thumbnail_cache_path(other, 16)));
-  EXPECT_TRUE(is_near(tavro_thumbnail_make(path, 16)[0], kBlue));
+  make_file(entry, file_contents(tavro_thumbnail_cache_path(other, 16)));
+  EXPECT_THAT(tavro_thumbnail_make(path, 16)[0], IsNear(kBlue));
   make_file(path, red, 2000);
-  EXPECT_TRUE(is_near(tavro_thumbnail_make(path, 16)[0], kRed));
+  EXPECT_THAT(tavro_thumbnail_make(path, 16)[0], IsNear(kRed));
 }
 
 TEST_F(Pictures, ADamagedEntryOfTheCacheIsMadeAnew) {
   const std::string path = make_file(in_root("photo.jpg"), jpeg_bytes(64, 64, kRed, kRed));
   tavro_thumbnail_make(path, 16);
-  const std::string entry = tavro_thumbnail_cache_path(path, 16), whole = bytes_of(entry);
+  const std::string entry = tavro_thumbnail_cache_path(path, 16), whole = file_contents(entry);
   for (const std::string &damaged : {std::string(), whole.substr(0, whole.size() / 2),
                                      std::string(500, '\xD9'), jpeg_bytes(64, 64, kBlue, kBlue)}) {
     make_file(entry, damaged);
-    EXPECT_TRUE(is_near(tavro_thumbnail_make(path, 16)[0], kRed));
-    EXPECT_TRUE(bytes_of(entry) == whole);
+    EXPECT_THAT(tavro_thumbnail_make(path, 16)[0], IsNear(kRed));
+    EXPECT_TRUE(file_contents(entry) == whole);
   }
 }
 

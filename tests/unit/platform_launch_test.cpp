@@ -136,7 +136,7 @@ TEST_F(LaunchRequest, WithoutReplyThatCannotBeDeliveredIsLogged) {
   make_startable(kService, "/no/such/program");
   ASSERT_EQ(send(kService, "go"), 0);
   EXPECT_TRUE(wait_for([] {
-    return read_file("/opt/usr/share/log/platform.log")
+    return file_contents("/opt/usr/share/log/platform.log")
                .find("request to " + kService + " was not delivered") != std::string::npos;
   }));
 }

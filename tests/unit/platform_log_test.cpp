@@ -16,7 +16,7 @@ constexpr const char *kFile = "/opt/usr/share/log/platform.log";
 std::string logged(const std::string &message) {
   unlink(kFile);
   dlog_print(DLOG_ERROR, "TEST", "%s", message.c_str());
-  return read_file(kFile);
+  return file_contents(kFile);
 }
 
 TEST(Log, MessageIsOneLineWhateverItHolds) {
@@ -40,7 +40,7 @@ TEST(Log, LinesOfSeveralProcessesStayWholeAcrossARotation) {
   const pid_t children[] = {start({program_of(kService), "--log", "7000"}),
                             start({program_of(kService), "--log", "7000"})};
   for (const pid_t child : children) ASSERT_EQ(wait_for_end(child), 0);
-  std::istringstream lines(read_file(std::string(kFile) + ".1") + read_file(kFile));
+  std::istringstream lines(file_contents(std::string(kFile) + ".1") + file_contents(kFile));
   int count = 0;
   for (std::string line; std::getline(lines, line); ++count) {
     ASSERT_THAT(line, EndsWith(" " + std::string(300, 'x') + " end"));

@@ -111,7 +111,7 @@ TEST(Preference, FileIsTheUsersAloneAndADamagedOneIsSetAside) {
     if (g_str_has_prefix(name, "preference.db.damaged-") && !is_beside) kept = name;
   }
   g_dir_close(folder);
-  EXPECT_NE(read_file("/opt/usr/dbspace/" + kept).find("####"), std::string::npos);
+  EXPECT_NE(file_contents("/opt/usr/dbspace/" + kept).find("####"), std::string::npos);
 }
 
 TEST(Preference, ChangeIsHeardByOthers) {

@@ -11,6 +11,7 @@
 
 #include <mutex>
 
+#include "bus_connection.h"
 #include "desktop_link.h"
 #include "platform_support.h"
 
@@ -26,17 +27,10 @@ class FakeService {
  public:
   FakeService(const char *name, std::vector<std::pair<std::string, const char *>> answers)
       : answers_(std::move(answers)) {
-    bus_ = g_dbus_connection_new_for_address_sync(
-        g_getenv("DBUS_SESSION_BUS_ADDRESS"),
-        static_cast<GDBusConnectionFlags>(G_DBUS_CONNECTION_FLAGS_AUTHENTICATION_CLIENT |
-                                          G_DBUS_CONNECTION_FLAGS_MESSAGE_BUS_CONNECTION),
-        nullptr, nullptr, nullptr);
+    bus_ = connect_to_bus();
     // The filter runs on the connection's own thread, so that calls that wait can be answered.
     g_dbus_connection_add_filter(bus_, filter_cb, this, nullptr);
-    GVariant *reply = g_dbus_connection_call_sync(bus_, "org.freedesktop.DBus", "/", "org.freedesktop.DBus",
-                                                  "RequestName", g_variant_new("(su)", name, 0), nullptr,
-                                                  G_DBUS_CALL_FLAGS_NONE, -1, nullptr, nullptr);
-    g_variant_unref(reply);
+    set_name_owned(bus_, name, true);
   }
   ~FakeService() {
     g_dbus_connection_close_sync(bus_, nullptr, nullptr);
@@ -98,7 +92,7 @@ TEST(Notification, WithoutAServiceIsLoggedAndForgotten) {
   notification_h noti = make_notification(NOTIFICATION_TYPE_NOTI, "nobody", "listens");
   EXPECT_EQ(notification_post(noti), 0);
   EXPECT_TRUE(wait_for([] {
-    return read_file("/opt/usr/share/log/platform.log").find("notification service failed") !=
+    return file_contents("/opt/usr/share/log/platform.log").find("notification service failed") !=
            std::string::npos;
   }));
   notification_free(noti);

@@ -15,6 +15,8 @@
 #include <string>
 #include <vector>
 
+#include "files.h"
+
 inline const std::string kService = "test.sample-service";
 inline const std::string kWindow = "test.window";
 
@@ -29,15 +31,8 @@ inline bool wait_for(const std::function<bool()> &condition, double seconds = 20
   return true;
 }
 
-inline std::string read_file(const std::string &path) {
-  std::ifstream file(path);
-  std::stringstream content;
-  content << file.rdbuf();
-  return content.str();
-}
-
 inline std::vector<std::string> record_of(const std::string &app_id) {
-  std::istringstream content(read_file("/opt/usr/" + app_id + ".record"));
+  std::istringstream content(file_contents("/opt/usr/" + app_id + ".record"));
   std::vector<std::string> lines;
   for (std::string line; std::getline(content, line);) lines.push_back(line);
   return lines;

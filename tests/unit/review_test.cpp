@@ -1,12 +1,12 @@
 // What is sent with a report, as a list and as texts: the plain logic behind the pages.
-#include <Elementary.h>
 #include <gmock/gmock.h>
 #include <minizip/zip.h>
-#include <unistd.h>
 
 #include <filesystem>
 #include <fstream>
 
+#include "files.h"
+#include "screens_world.h"
 #include "tavro-common.h"
 #include "tavro-main.h"
 #include "tavro_appdata.h"
@@ -25,9 +25,7 @@ using testing::HasSubstr;
 constexpr char kArchive[] = "/opt/usr/media/log.zip";
 
 std::string make_file(const std::string &name, size_t size) {
-  std::filesystem::create_directories("/opt/usr/media");
-  std::ofstream("/opt/usr/media/" + name) << std::string(size, 'x');
-  return "/opt/usr/media/" + name;
+  return write_file("/opt/usr/media/" + name, std::string(size, 'x'));
 }
 
 // "title|detail|what its button does", for each item.
@@ -147,8 +145,7 @@ TEST(DeviceStatus, HasAZeroForEachValueThatTheMachineDoesNotHave) {
   EXPECT_THAT(text, testing::Not(HasSubstr("RSSI")));
   const std::string path = make_file("status.txt", 0);
   tavro_get_extra_device_data(path.c_str());
-  std::ifstream file(path);
-  EXPECT_EQ(text.substr(0, 100), std::string(std::istreambuf_iterator<char>(file), {}).substr(0, 100));
+  EXPECT_EQ(text.substr(0, 100), file_contents(path).substr(0, 100));
   tavro_get_extra_device_data("/opt/usr/media/none/status.txt");
   EXPECT_FALSE(std::filesystem::exists("/opt/usr/media/none"));
 }
@@ -166,27 +163,13 @@ TEST(DeviceStatus, SkipsExternalStorageAndEndsAtTheFirstInternalOne) {
   free(text);
 }
 
-class ReviewPage : public testing::Test {
+class ReviewPage : public Screens {
  protected:
-  static void SetUpTestSuite() {
-    setenv("ELM_ENGINE", "buffer", 1);
-    char name[] = "review_test", *arguments[] = {name, nullptr};
-    elm_init(1, arguments);
-    tavro_dbmgr_init_semaphore();
-    tavro_dbmgr_ensure_schema();
-  }
-  static void TearDownTestSuite() { elm_shutdown(); }
   void SetUp() override {
-    tavro_initialize_application_data(&ad_);
-    ASSERT_TRUE(tavro_create_base_window(&ad_));
-    tavro_create_landing_page(&ad_);
+    start();
     tavro_create_problem_page(&ad_, nullptr);
   }
-  void TearDown() override {
-    evas_object_del(ad_.win);
-    ecore_main_loop_iterate();
-    tavro_dealloc_memory(&ad_);
-  }
+  void TearDown() override { end(); }
 
   size_t pages() {
     Eina_List *items = elm_naviframe_items_get(ad_.nf);
@@ -194,17 +177,7 @@ class ReviewPage : public testing::Test {
     eina_list_free(items);
     return count;
   }
-
-  appdata ad_{};
 };
-
-void settle(double seconds = 0.5) {
-  const double end = ecore_time_get() + seconds;
-  while (ecore_time_get() < end) {
-    ecore_main_loop_iterate();
-    usleep(1000);
-  }
-}
 
 TEST_F(ReviewPage, IsThereOnceAndGoesWithItsComposeScreen) {
   settle();

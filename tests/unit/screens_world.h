@@ -18,6 +18,28 @@
 #include "tavro_handles.h"
 #include "tavro_screens.h"
 
+// By the text that it shows, or the name that a screen reader is told.
+inline Evas_Object *find_button(Evas_Object *below, const char *name) {
+  if (elm_object_widget_check(below) && strstr(elm_object_widget_type_get(below), "Button") &&
+      (g_strcmp0(elm_object_text_get(below), name) == 0 ||
+       g_strcmp0(efl_access_object_i18n_name_get(below), name) == 0))
+    return below;
+  const TavroHandle<Eina_List, eina_list_free> members(evas_object_smart_members_get(below));
+  Evas_Object *found = nullptr;
+  for (Eina_List *link = members.get(); link && !found; link = eina_list_next(link))
+    found = find_button(static_cast<Evas_Object *>(eina_list_data_get(link)), name);
+  return found;
+}
+
+// The topmost of this name in a window.
+inline Evas_Object *find_top_button(Evas_Object *window, const char *name) {
+  Evas_Object *found = nullptr;
+  for (Evas_Object *top = evas_object_top_get(evas_object_evas_get(window)); top && !found;
+       top = evas_object_below_get(top))
+    found = find_button(top, name);
+  return found;
+}
+
 class Screens : public testing::Test {
  protected:
   // Once for all suites of a program: the toolkit forgets the client's look when it is shut down.
@@ -60,18 +82,6 @@ class Screens : public testing::Test {
   }
 
   static void tap(Evas_Object *button) { evas_object_smart_callback_call(button, "clicked", nullptr); }
-  // By the text that it shows, or the name that a screen reader is told.
-  static Evas_Object *find_button(Evas_Object *below, const char *name) {
-    if (elm_object_widget_check(below) && strstr(elm_object_widget_type_get(below), "Button") &&
-        (g_strcmp0(elm_object_text_get(below), name) == 0 ||
-         g_strcmp0(efl_access_object_i18n_name_get(below), name) == 0))
-      return below;
-    const TavroHandle<Eina_List, eina_list_free> members(evas_object_smart_members_get(below));
-    Evas_Object *found = nullptr;
-    for (Eina_List *link = members.get(); link && !found; link = eina_list_next(link))
-      found = find_button(static_cast<Evas_Object *>(eina_list_data_get(link)), name);
-    return found;
-  }
   // Tap a popup's button, by string id; false when it has none of this text.
   static bool answer(Evas_Object *popup, const char *text) {
     Evas_Object *found = popup ? find_button(popup, tavro_text(text)) : nullptr;

@@ -3,11 +3,6 @@
 
 namespace {
 
-void respond(SoupServerMessage *message, int status, const std::string &body) {
-  soup_server_message_set_status(message, static_cast<guint>(status), nullptr);
-  soup_server_message_set_response(message, "application/json", SOUP_MEMORY_COPY, body.data(), body.size());
-}
-
 void answer_half(SoupServerMessage *message) {
   GObjectPtr<GIOStream> stream(soup_server_message_steal_connection(message));
   const char half[] = "HTTP/1.1 201 Created\r\nContent-Length: 900\r\n\r\n{\"id\": 7";

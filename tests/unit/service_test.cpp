@@ -3,6 +3,7 @@
 
 namespace {
 
+// The service's own: changed, it is as a kill at a certain moment would have left it.
 constexpr char kMemory[] = "/opt/usr/apps/corvane.tavro-svc/data/service.db";
 constexpr char kLog[] = "/opt/usr/share/log/platform.log";
 
@@ -12,14 +13,14 @@ class Service : public ServiceWorld {
     ServiceWorld::SetUp();
     start_desk();
   }
+  // Comes with the service.
+  int send_report(const std::vector<std::string> &paths = {}) {
+    const int id = store_report(paths);
+    start_service();
+    EXPECT_TRUE(wait_for_state(id, "1"));
+    return id;
+  }
 };
-
-// Changes the service's own memory, as a kill at a certain moment would have left it.
-void alter_memory(const char *sql) {
-  TavroDb db;
-  sqlite3_open(kMemory, tavro_out(db));
-  ASSERT_EQ(sqlite3_exec(db.get(), sql, nullptr, nullptr, nullptr), SQLITE_OK);
-}
 
 TEST_F(Service, BringsAReportWithAllItsFilesToTheDesk) {
   const std::string picture(3000000, 'p');  // more than one piece
@@ -46,21 +47,29 @@ TEST_F(Service, SendsAReportWithoutTheFilesThatCannotBeSentAndNamesThem) {
   std::filesystem::create_directories("/opt/usr/media/folder.png");
   const std::string huge = make_file("huge.mp4", "");
   std::filesystem::resize_file(huge, 65ll * 1024 * 1024);
-  const int id = store_report(
+  const int id = send_report(
       {"/opt/usr/media/gone.png", "/opt/usr/media/folder.png", huge, make_file("good.png", "good")});
-  start_service();
-  ASSERT_TRUE(wait_for_state(id, "1"));
   const auto report = desk_report(id);
   EXPECT_EQ(report["missing"], nlohmann::json({"gone.png", "folder.png", "huge.mp4"}));
   EXPECT_EQ(report["attachments"].size(), 2u);
 }
 
+TEST_F(Service, SendsPicturesWithoutTheirMetadataAndNoneThatItCannotTakeItFrom) {
+  using namespace std::string_literals;
+  const std::string rest = "\xFF\xDA\0\x02pixels\xFF\xD9"s;
+  const std::string picture = "\xFF\xD8\xFF\xE1\0\x0E"s + "Exif\0\0where?"s + rest;
+  const std::string path = make_file("holiday.jpg", picture);
+  const int id = send_report({path, make_file("broken.jpg", "\xFF\xD8\xFF\xE1\xFF\xFF where?")});
+  EXPECT_EQ(file_contents(desk_folder_ + "/reports/" + column("VOC_ID_SERVER", id) + "/2"),
+            "\xFF\xD8" + rest);
+  EXPECT_EQ(desk_report(id)["missing"], nlohmann::json({"broken.jpg"}));
+  EXPECT_EQ(file_contents(path), picture);
+}
+
 TEST_F(Service, LeavesTheLastAttachmentsBehindWhenThereAreMoreFilesThanTheDeskTakes) {
   std::vector<std::string> paths;
   for (int i = 1; i <= 33; ++i) paths.push_back(make_file(std::to_string(i) + ".png", "p"));
-  const int id = store_report(paths);
-  start_service();
-  ASSERT_TRUE(wait_for_state(id, "1"));
+  const int id = send_report(paths);
   const auto report = desk_report(id);
   EXPECT_EQ(report["missing"], nlohmann::json({"32.png", "33.png"}));
   EXPECT_EQ(report["attachments"][0]["kind"], "device_status");
@@ -105,9 +114,7 @@ TEST_F(Service, SendsARequestedReportOnlyOnceItIsWrittenWhole) {
 
 TEST_F(Service, KeepsAMessageUntilAClientThatIsAwayIsBack) {
   set_client_present(false);
-  const int id = store_report();
-  start_service();
-  ASSERT_TRUE(wait_for_state(id, "1"));
+  const int id = send_report();
   run_loop_for(1000);  // more than five tries
   set_client_present(true);
   EXPECT_TRUE(wait_for_message("SUCCESS " + std::to_string(id)));
@@ -141,13 +148,13 @@ TEST_F(Service, KeepsADraftADraftUntilItHasArrivedAlsoWhenItIsKilledMeanwhile) {
   service_.kill();
   FakeDesk silent;
   silent.on_report = [](SoupServerMessage *message) { soup_server_message_pause(message); };
-  alter_memory("DELETE FROM value WHERE name = 'token'");
+  run("DELETE FROM value WHERE name = 'token'", kMemory);
   start_service(silent.url);
   launch("TAVRO_SEND_FAILED_VOC", id);
   ASSERT_TRUE(wait_until([&] { return silent.reports > 0; }));
   EXPECT_EQ(column("VOC_STATE", id), "6");
   service_.kill();
-  alter_memory("DELETE FROM value WHERE name = 'token'");
+  run("DELETE FROM value WHERE name = 'token'", kMemory);
   start_service();
   EXPECT_TRUE(wait_for_state(id, "1"));
 }
@@ -173,22 +180,18 @@ TEST_F(Service, BringsAnAnswerToAnIdeaIntoTheStoreAndToTheClient) {
 }
 
 TEST_F(Service, WritesAnAnswerOnceWhenItDiesBetweenWritingItAndNotingSo) {
-  const int id = store_report();
-  start_service();
-  ASSERT_TRUE(wait_for_state(id, "1"));
+  const int id = send_report();
   answer(id, 2, "Once");
   ASSERT_TRUE(wait_for_message("UPDATED " + std::to_string(id) + " Once"));
   service_.kill();
-  alter_memory("UPDATE value SET value = '0' WHERE name = 'cursor'; INSERT INTO intent VALUES(1, 1, 1)");
+  run("UPDATE value SET value = '0' WHERE name = 'cursor'; INSERT INTO intent VALUES(1, 1, 1)", kMemory);
   start_service();
   ASSERT_TRUE(wait_for_message("UPDATED " + std::to_string(id) + " Once", 2));
   EXPECT_EQ(column("VOC_STATE", id), "1#2");
 }
 
 TEST_F(Service, FindsTheReportOfAnAnswerThatOvertookTheEndOfItsUpload) {
-  const int id = store_report();
-  start_service();
-  ASSERT_TRUE(wait_for_state(id, "1"));
+  const int id = send_report();
   service_.kill();
   answer(id, 4, "Done");
   run("UPDATE TABLE_VOC SET VOC_STATE = '10', VOC_ID_SERVER = NULL");

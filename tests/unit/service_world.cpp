@@ -5,6 +5,7 @@
 
 #include <algorithm>
 
+#include "bus_connection.h"
 #include "json_fields.h"
 
 namespace {
@@ -15,12 +16,12 @@ constexpr char kInterface[] =
     "<arg type='a(ss)' direction='in'/><arg type='i' direction='out'/><arg type='a(ss)' direction='out'/>"
     "</method></interface></node>";
 
-void answer_json(SoupServerMessage *message, int status, const std::string &body) {
+}  // namespace
+
+void respond(SoupServerMessage *message, int status, const std::string &body) {
   soup_server_message_set_status(message, static_cast<guint>(status), nullptr);
   soup_server_message_set_response(message, "application/json", SOUP_MEMORY_COPY, body.data(), body.size());
 }
-
-}  // namespace
 
 void Program::start(const std::vector<std::string> &arguments, int stdout_fd) {
   kill();
@@ -73,11 +74,11 @@ FakeDesk::FakeDesk() : server_(soup_server_new(nullptr, nullptr)) {
     auto *self = static_cast<FakeDesk *>(data);
     if (strcmp(path, "/api/v1/devices") == 0) {
       self->token = "token" + std::to_string(++self->registrations);
-      return answer_json(message, 201, R"({"device": "d", "token": ")" + self->token + "\"}");
+      return respond(message, 201, R"({"device": "d", "token": ")" + self->token + "\"}");
     }
     if (strcmp(path, "/api/v1/reports") == 0) return ++self->reports, self->on_report(message);
     if (strstr(path, "/attachments/") && self->on_file) return ++self->files, self->on_file(message);
-    if (strstr(path, "/complete")) return answer_json(message, 200, R"({"id": 7, "status": 1})");
+    if (strstr(path, "/complete")) return respond(message, 200, R"({"id": 7, "status": 1})");
     soup_server_message_pause(message);  // no news
   };
   soup_server_add_handler(server, nullptr, take, this, nullptr);
@@ -103,11 +104,7 @@ void ServiceWorld::SetUp() {
 }
 
 void ServiceWorld::set_client_present(bool is_present) {
-  GVariant *name = is_present ? g_variant_new("(su)", "corvane.tavro-lite", 4)
-                              : g_variant_new("(s)", "corvane.tavro-lite");
-  g_variant_unref(g_dbus_connection_call_sync(bus_.get(), "org.freedesktop.DBus", "/", "org.freedesktop.DBus",
-                                              is_present ? "RequestName" : "ReleaseName", name, nullptr,
-                                              G_DBUS_CALL_FLAGS_NONE, -1, nullptr, nullptr));
+  set_name_owned(bus_.get(), "corvane.tavro-lite", is_present);
 }
 
 void ServiceWorld::TearDown() {
@@ -236,7 +233,5 @@ bool ServiceWorld::wait_for_message(const std::string &message, int count) {
 }
 
 std::string ServiceWorld::make_file(const std::string &name, const std::string &content) {
-  const std::string path = "/opt/usr/media/" + name;
-  std::ofstream(path, std::ios::binary) << content;
-  return path;
+  return write_file("/opt/usr/media/" + name, content);
 }

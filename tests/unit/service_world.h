@@ -28,6 +28,9 @@ class Program {
 bool wait_until(const std::function<bool()> &condition);
 void run_loop_for(unsigned ms);
 
+// What a desk answers, in JSON.
+void respond(SoupServerMessage *message, int status, const std::string &body);
+
 // A desk whose answer to a report is what the test says; it registers every phone and has no news.
 class FakeDesk {
  public:

@@ -25,12 +25,6 @@ class SaveJournal : public StoreWorld {
     return report;
   }
 
-  static std::string rows() {
-    return value(
-        "SELECT (SELECT count(*) FROM TABLE_VOC) || '/' || (SELECT count(*) FROM ATTACHMENT) || '/' || "
-        "(SELECT count(*) FROM TABLE_VOC_EXTENDED)");
-  }
-
   static void expect_whole(int id) {
     const Voc voc(tavro_dbmgr_get_voc_by_id(id));
     ASSERT_NE(voc, nullptr);

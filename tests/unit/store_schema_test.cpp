@@ -126,11 +126,4 @@ TEST_F(StoreSchema, RefusedOpenAndCloseLeaveTheLockAlone) {
   EXPECT_EQ(lock_value(), 1);
 }
 
-TEST_F(StoreSchema, ClearingATableEmptiesIt) {
-  save_problem("user", "text");
-  for (int i = 0; i < 2; i++) EXPECT_EQ(_tavro_dbmgr_clear_db("TABLE_VOC"), 0);
-  EXPECT_EQ(value("SELECT count(*) FROM TABLE_VOC"), "0");
-  EXPECT_THAT(log(), HasSubstr("Deleted all the elements from the table TABLE_VOC"));
-}
-
 }  // namespace

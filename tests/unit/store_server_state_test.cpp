@@ -42,16 +42,6 @@ TEST_F(StoreServerState, AnswersAccumulateAndMarkTheReportUnread) {
   EXPECT_THAT(column("VOC_DATE_OF_UPDATION", id), MatchesRegex("([0-9]+000#){5}" + sent));
 }
 
-TEST_F(StoreServerState, AnswerForAnotherServerIdChangesNothing) {
-  const int id = save_problem("user", "text");
-  tavro_dbmgr_update_server_voc_id(id, 77);
-  const std::string before = file_contents(TAVRO_DBMGR_FILE);
-  for (const char *server_id : {"78", "0 OR 1=1", "77' OR '1'='1", "", "seventy-seven"})
-    EXPECT_EQ(_tavro_dbmgr_update_push_status_comments(server_id, "2", "hello"), 0);
-  EXPECT_EQ(_tavro_dbmgr_update_push_status_comments(nullptr, "2", "hello"), 0);
-  EXPECT_EQ(file_contents(TAVRO_DBMGR_FILE), before);
-}
-
 TEST_F(StoreServerState, LostNetworkTouchesOnlyTheUsersReportsThatAreBeingSent) {
   for (int i = 0; i < 3; i++) save_problem("o'user", "text");
   save_problem("other", "text");

@@ -10,13 +10,12 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
-#include <filesystem>
-#include <fstream>
 #include <functional>
-#include <iterator>
 #include <string>
 #include <vector>
 
+#include "files.h"
+#include "store_access.h"
 #include "tavro_dbmgr.h"
 #include "tavro_handles.h"
 #include "tavro_memory.h"
@@ -68,24 +67,6 @@ class StoreWorld : public ::testing::Test {
       if (slot.slotfree) ADD_FAILURE() << "block held from " << slot.fileName << ":" << slot.lineNo;
   }
 
-  // First value of a statement, read through a connection of the test's own; "NULL" for NULL or no row.
-  static std::string value(const std::string &sql) {
-    TavroDb db;
-    sqlite3_open(TAVRO_DBMGR_FILE, tavro_out(db));
-    TavroStmt statement;
-    EXPECT_EQ(sqlite3_prepare_v2(db.get(), sql.c_str(), -1, tavro_out(statement), nullptr), SQLITE_OK)
-        << sql << ": " << sqlite3_errmsg(db.get());
-    if (sqlite3_step(statement.get()) != SQLITE_ROW) return "NULL";
-    const auto *text = reinterpret_cast<const char *>(sqlite3_column_text(statement.get(), 0));
-    return text ? text : "NULL";
-  }
-
-  static void run(const std::string &sql) {
-    TavroDb db;
-    sqlite3_open(TAVRO_DBMGR_FILE, tavro_out(db));
-    EXPECT_EQ(sqlite3_exec(db.get(), sql.c_str(), nullptr, nullptr, nullptr), SQLITE_OK) << sql;
-  }
-
   static int lock_value() { return semctl(dbmgr_semid, 0, GETVAL); }
   static std::string log() {
     const std::string path = "/opt/usr/share/log/platform.log";
@@ -97,9 +78,11 @@ class StoreWorld : public ::testing::Test {
     return text ? text : "NULL";
   }
 
-  static std::string file_contents(const std::string &path) {
-    std::ifstream file(path, std::ios::binary);
-    return {std::istreambuf_iterator<char>(file), {}};
+  // How many reports, attachments and second parts of reports there are.
+  static std::string rows() {
+    return value(
+        "SELECT (SELECT count(*) FROM TABLE_VOC) || '/' || (SELECT count(*) FROM ATTACHMENT) || '/' || "
+        "(SELECT count(*) FROM TABLE_VOC_EXTENDED)");
   }
 };
 
