@@ -5,7 +5,7 @@ import time
 
 import pytest
 
-from captured import BLUE, ORANGE, Pixels, coloured_window, is_near, length
+from captured import BLACK, BLUE, ORANGE, Pixels, coloured_window, is_near, length
 from phone_driver import wait_until
 from road import Road
 
@@ -52,6 +52,16 @@ class Capture(Road):
         seen = Pixels(self.phone.screenshot(self.phone.directory / "tile.png")).some_colours()
         return all(any(is_near(one, colour, 16) for one in seen) for colour in (BLUE, ORANGE))
 
+    def hide_the_middle(self):
+        """In the editor; left, top, right and bottom of what is hidden, in pixels of the screenshot."""
+        self.screen.activate("Hide")
+        self.screen.find("Picture, no hidden area chosen").get_component_iface().grab_focus()
+        self.phone.press("Return")
+        self.screen.wait_for("Hidden area 1 of 1")
+        place = re.match(r"Left (\d+), top (\d+), (\d+) by (\d+) ", self.screen.description("Hidden area 1 of 1"))
+        left, top, width, height = map(int, place.groups())
+        return left, top, left + width, top + height
+
     def leave(self):
         self.back()
         if self.screen.look("Keep writing"):
@@ -77,10 +87,11 @@ def road():
         yield road
 
 
-def test_a_screenshot_shows_the_window_and_nothing_of_the_control(road):
+def test_a_screenshot_shows_the_window_nothing_of_the_control_and_nothing_that_was_hidden(road):
     road.begin("A screenshot", "Take screenshot")
     road.screen.activate("Capture")
     road.screen.wait_for("Selected area")
+    left, top, right, bottom = road.hide_the_middle()
     road.screen.activate("Done")
     wait_until(road.attached, what="the picture")
     assert len(road.attached()) == 1
@@ -91,11 +102,13 @@ def test_a_screenshot_shows_the_window_and_nothing_of_the_control(road):
     picture = Pixels(road.phone.directory / "sent")
     # The status bar's 146 rows are cut off, the other 1134 fill 1200.
     assert picture.size == (720, 1200)
-    seam = round((640 - 146) * 1200 / 1134)
-    for y in range(5, 1200, 45):
-        for x in (2, 40, 360, 600, 717):
-            if abs(y - seam) > 6:
-                assert is_near(picture.at(x, y), BLUE if y < seam else ORANGE), (x, y)
+    top, seam, bottom = (round((y - 146) * 1200 / 1134) for y in (top, 640, bottom))
+    seen = {(x, y): picture.at(x, y) for y in range(5, 1200, 45) for x in (2, 40, 360, 600, 717)
+            if all(abs(y - edge) > 6 for edge in (top, seam, bottom))}
+    hidden = {(x, y) for x, y in seen if left < x < right and top < y < bottom}
+    assert len(hidden) > 2
+    for place, colour in seen.items():
+        assert is_near(colour, BLACK if place in hidden else BLUE if place[1] < seam else ORANGE), place
 
 
 def test_a_video_is_as_long_as_the_display_said_without_its_pauses(road):

@@ -11,6 +11,7 @@ from gi.repository import Gst  # noqa: E402
 from phone_driver import wait_until  # noqa: E402
 
 BLUE, ORANGE = (32, 64, 192), (240, 128, 16)  # the window, above and below
+BLACK = (0, 0, 0)  # what is hidden
 
 
 class Pixels:
