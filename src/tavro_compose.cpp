@@ -208,6 +208,7 @@ void tavro_compose_rest(appdata *ad) {
   Evas_Object *page = elm_layout_edje_get(view->layout);
   edje_object_signal_emit(page, "tavro,rest", "tavro");
   edje_object_message_signal_process(page);  // before the next touch
+  edje_object_calc_force(page);
 }
 
 void tavro_create_problem_page(appdata *ad, const svc_voc_data *draft) {

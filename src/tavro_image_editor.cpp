@@ -136,7 +136,9 @@ void _start(image_editor *editor) {
   evas_object_smart_callback_add(ad->nf, "transition,finished", _shown_cb, editor);
   editor->item = tavro_page_push(ad, ad->crop_layout, title);
   elm_naviframe_item_pop_cb_set(editor->item, _pop_cb, editor);
-  editor_hint(editor, "IDS_OB_TPOP_MOVE_OR_RESIZE_THE_BOX_TO_HIGHLIGHT_THE_PROBLEM_AREA");
+  editor_hint(editor, editor->is_screenshot
+                          ? "IDS_OB_TPOP_MOVE_OR_RESIZE_THE_BOX_TO_HIGHLIGHT_THE_PROBLEM_AREA"
+                          : "IDS_OB_TPOP_MOVE_OR_RESIZE_THE_BOX_TO_CROP");
 }
 
 void _launch(appdata *ad, const char *path, bool is_screenshot) {
@@ -170,6 +172,7 @@ void editor_leave(image_editor *editor) {
   tavro_autosave_set_screenshot("");
   if (editor->ad->imgedit_popup) evas_object_del(editor->ad->imgedit_popup);  // a question that is answered
   Evas_Object *nf = editor->ad->nf;
+  tavro_compose_rest(editor->ad);  // "Done" lies over the report's "Send"
   if (elm_naviframe_top_item_get(nf) == editor->item)
     elm_naviframe_item_pop(nf);
   else

@@ -1,6 +1,8 @@
 #include "tavro_share.h"
 
 #include <Elementary.h>
+#include <notification.h>
+#include <notification_status.h>
 
 #include <cstring>
 #include <string>
@@ -14,6 +16,7 @@
 #include "tavro_compose_keeper.h"
 #include "tavro_compose_strip.h"
 #include "tavro_handles.h"
+#include "tavro_image_editor.h"
 #include "tavro_preferences.h"
 #include "tavro_request.h"
 #include "tavro_screens.h"
@@ -126,4 +129,7 @@ void tavro_attach_waiting_files(appdata *ad) {
   _append_text(view, content.text);
   _attach(ad, content.files, _left_out(content));
   tavro_compose_keeper_note();
+  // It covers what has changed.
+  if (tavro_image_editor_kept_page() && !ad->cancel_popup)
+    notification_status_message_post(tavro_text("IDS_OB_TPOP_ADDED_TO_REPORT"));
 }
